@@ -1,0 +1,73 @@
+#include "FormatBase.h"
+
+#include <iostream>
+#include <utility>
+
+namespace Tarvek {
+namespace Conf {
+
+FormatBase::FormatBase(const std::string& name) : property_(name) {
+  internal_properties_.put(TAG_OBJECT, name);
+  property_.SetChild(TAG_METADATA);
+}
+
+FormatBase::~FormatBase() = default;
+
+int FormatBase::AddRef() const { return ref_count_.AddRefImpl(); }
+
+int FormatBase::GetRefCount() const { return ref_count_.GetRefCountImpl(); }
+
+int FormatBase::Release() const {
+  const int left = ref_count_.ReleaseImpl();
+  if (left == 0) delete this;
+  return left;
+}
+
+const Core::Property& FormatBase::GetProperty() const { return property_; }
+
+void FormatBase::SetProperty(const Core::Property& tree) {
+  // Build the new tree aside, so that a tree that cannot take the metadata child (a leaf) is
+  // refused with the description untouched, instead of leaving a root without metadata.
+  Core::Property replacement(property_.GetName());
+  replacement = tree;
+  if (!replacement.ChildExists(TAG_METADATA)) replacement.SetChild(TAG_METADATA);
+  property_ = std::move(replacement);
+}
+
+boost::property_tree::ptree& FormatBase::GetInternalProperties() { return internal_properties_; }
+
+const boost::property_tree::ptree& FormatBase::GetInternalProperties() const {
+  return internal_properties_;
+}
+
+void FormatBase::SetMetadata(const Core::Property& metadata) {
+  property_.SetChild(TAG_METADATA, metadata);
+}
+
+const Core::Property& FormatBase::GetMetadata() const { return property_[TAG_METADATA]; }
+
+void FormatBase::PrintContent() {
+  std::ostream& out = std::cout;
+  out << "======External props:=====" << std::endl;
+  Core::PrintPropertyValue(property_, 0, out, true, true);
+  out << "======Runtime props:=======" << std::endl;
+  for (const auto& entry : internal_properties_) {
+    out << entry.first << ": " << entry.second.data() << std::endl;
+  }
+}
+
+bool FormatBase::Compare(boost::intrusive_ptr<const IFormat> other) const {
+  // A description equals no absent one.
+  if (!other) return false;
+  return property_ == other->GetProperty();
+}
+
+bool FormatBase::IsCompatible(boost::intrusive_ptr<const IFormat> /*other*/) const { return true; }
+
+void FormatBase::CopyTreesFrom(const FormatBase& source) {
+  property_ = source.property_;
+  internal_properties_ = source.internal_properties_;
+}
+
+}  // namespace Conf
+}  // namespace Tarvek

@@ -1,0 +1,70 @@
+// Tarvek::Conf::FormatBase: the common implementation of IFormat under every format description:
+// the reference count, the property tree with its metadata child, and the runtime entries.
+// It has no factory; the description classes (FormatCodec and its kinds) build on it.
+#ifndef TARVEK_CONF_FORMATS_FORMATBASE_H_
+#define TARVEK_CONF_FORMATS_FORMATBASE_H_
+
+#include <boost/intrusive_ptr.hpp>
+#include <boost/property_tree/ptree.hpp>
+#include <string>
+
+#include "../../Core/Interfaces/Export.h"
+#include "../../Core/Interfaces/Property.h"
+#include "../../Core/Interfaces/RefCountImpl.h"
+#include "../Interfaces/IFormat.h"
+
+namespace Tarvek {
+namespace Conf {
+
+/// Key of the runtime entry holding a description's object name.
+const std::string TAG_OBJECT = "object_name";
+
+/// The shared part of every description. Constructed with an object name, which names the
+/// property tree's root and is recorded as the runtime entry TAG_OBJECT. The count starts at 0;
+/// the Release() that brings it back to 0 deletes the whole object, so descriptions are created
+/// with new and held through boost::intrusive_ptr.
+class TARVEK_FORMATS_API FormatBase : public virtual IFormat {
+ public:
+  /// A description named `name`: a root with one empty metadata child, one runtime entry.
+  explicit FormatBase(const std::string& name);
+  FormatBase(const FormatBase&) = delete;
+  FormatBase& operator=(const FormatBase&) = delete;
+  ~FormatBase() override;
+
+  int AddRef() const override;
+  int GetRefCount() const override;
+  int Release() const override;
+
+  const Core::Property& GetProperty() const override;
+  void SetProperty(const Core::Property& tree) override;
+  boost::property_tree::ptree& GetInternalProperties() override;
+  const boost::property_tree::ptree& GetInternalProperties() const override;
+  void SetMetadata(const Core::Property& metadata) override;
+  const Core::Property& GetMetadata() const override;
+  /// Writes "======External props:=====", the property tree, "======Runtime props:=======" and
+  /// one "key: value" line a top-level runtime entry to standard output, flushing each line.
+  void PrintContent() override;
+  bool Compare(boost::intrusive_ptr<const IFormat> other) const override;
+  /// Always true: a description with no kind of its own accepts any other.
+  bool IsCompatible(boost::intrusive_ptr<const IFormat> other) const override;
+
+ protected:
+  /// Copies `source`'s property tree and runtime entries into this description (for Clone).
+  void CopyTreesFrom(const FormatBase& source);
+
+  // Declared in construction order: count, property tree, runtime entries.
+ private:
+  RefCountImpl ref_count_;
+
+ protected:
+  /// The settings; the description classes keep each one as a child of this root.
+  Core::Property property_;
+
+ private:
+  boost::property_tree::ptree internal_properties_;
+};
+
+}  // namespace Conf
+}  // namespace Tarvek
+
+#endif  // TARVEK_CONF_FORMATS_FORMATBASE_H_

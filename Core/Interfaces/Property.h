@@ -1,0 +1,241 @@
+// Tarvek::Core::Property: a named tree of typed values, the store behind every format description,
+// and the typed child helpers SetChildT / CreateChildT that every description setter writes with.
+//
+// A node has a name, a type (Tarvek::PropertyTypes), a value and an ordered list of children.
+// Leaves hold a bool, a 64-bit integer or a string; containers hold no value and are the only
+// nodes with children. Names need not be unique among siblings: look-ups take the first match.
+//
+//   Tarvek::Core::Property tree("settings");
+//   tree.SetChildT<long long>("width", 1920);
+//   tree.SetChildT<std::string>("codec_id", "h264");
+//   long long width = tree["width"].GetInt64();   // const look-up throws ChildNotFound if absent
+#ifndef TARVEK_CORE_INTERFACES_PROPERTY_H_
+#define TARVEK_CORE_INTERFACES_PROPERTY_H_
+
+#include <iosfwd>
+#include <list>
+#include <string>
+#include <type_traits>
+#include <variant>
+
+#include "../Errors/AddStack.h"
+#include "../Errors/PropertyException.h"
+#include "Export.h"
+#include "PropertyTypes.h"
+
+namespace Tarvek {
+namespace Core {
+
+/// A named node of a tree of typed values. Copies are deep; children are kept by value in a
+/// std::list, so a reference to a child stays valid while siblings are added or removed.
+/// Not synchronised: share a tree between threads only for reading.
+class TARVEK_CORE_API Property {
+ public:
+  using Children = std::list<Property>;
+  using iterator = Children::iterator;
+  using const_iterator = Children::const_iterator;
+
+  /// An empty container named `name`.
+  explicit Property(const std::string& name);
+  /// A leaf holding `value`.
+  Property(const std::string& name, bool value);
+  Property(const std::string& name, long long value);
+  Property(const std::string& name, const std::string& value);
+  /// A string leaf (without this, a string literal would silently become a bool).
+  Property(const std::string& name, const char* value);
+  /// An int64 leaf from any other integer type (int, unsigned, long ...), widened to long long.
+  template <class Integer,
+            std::enable_if_t<std::is_integral_v<Integer> && !std::is_same_v<Integer, bool> &&
+                                 !std::is_same_v<Integer, long long>,
+                             int> = 0>
+  Property(const std::string& name, Integer value)
+      : Property(name, static_cast<long long>(value)) {}
+
+  /// Deep copy: name, type, value and all children.
+  Property(const Property& other);
+  Property(Property&& other) noexcept;
+  virtual ~Property();
+
+  /// Takes `other`'s type, value and children and KEEPS this node's name, so a subtree can be
+  /// replaced in place and stays reachable under its key. Safe when `other` is this node or one
+  /// of its descendants; on failure this node is unchanged.
+  Property& operator=(const Property& other);
+  /// Takes `other`'s name, type, value and children; `other` is left an empty container.
+  Property& operator=(Property&& other) noexcept;
+  /// Makes this node a leaf holding `value`: type and value replaced, children dropped, name kept.
+  Property& operator=(bool value);
+  Property& operator=(long long value);
+  Property& operator=(const std::string& value);
+  Property& operator=(const char* value);
+  template <class Integer,
+            std::enable_if_t<std::is_integral_v<Integer> && !std::is_same_v<Integer, bool> &&
+                                 !std::is_same_v<Integer, long long>,
+                             int> = 0>
+  Property& operator=(Integer value) {
+    return *this = static_cast<long long>(value);
+  }
+
+  /// The node's name.
+  const std::string& GetName() const noexcept { return name_; }
+  /// The node's type.
+  PropertyTypes GetType() const noexcept;
+  /// The children, in the order they were added.
+  const Children& GetChildren() const noexcept { return children_; }
+
+  /// Whether a direct child is named `key`.
+  bool ChildExists(const std::string& key) const noexcept;
+  /// The first direct child named `key`, or GetChildren().end().
+  iterator FindChild(const std::string& key) noexcept;
+  const_iterator FindChild(const std::string& key) const noexcept;
+
+  /// The first direct child named `key`; never creates one. Throws ChildNotFound when there is
+  /// none.
+  const Property& operator[](const std::string& key) const;
+  /// The first direct child named `key`, appending an empty container child when there is none.
+  /// Throws MethodIsNotApplicable when this node is not a container and has no such child.
+  Property& operator[](const std::string& key);
+
+  /// Makes child `key` an empty container: appends one, or empties the existing child in place.
+  /// Returns it. Throws MethodIsNotApplicable when this node is not a container.
+  Property& SetChild(const std::string& key);
+  /// Makes child `key` hold `value`'s type, value and children (appending it when missing); the
+  /// child keeps the name `key`. Returns it. Throws MethodIsNotApplicable when this node is not a
+  /// container.
+  Property& SetChild(const std::string& key, const Property& value);
+
+  /// The value of a bool leaf. Throws WrongPropertyType for any other type.
+  bool GetBool() const;
+  /// The value of an int64 leaf. Throws WrongPropertyType for any other type.
+  long long GetInt64() const;
+  /// The value of a string leaf, by reference (valid until the node changes). Throws
+  /// WrongPropertyType for any other type.
+  const std::string& GetString() const;
+
+  /// Deep equality: same name, type and value, and pairwise equal children in the same order.
+  bool operator==(const Property& other) const noexcept;
+  bool operator!=(const Property& other) const noexcept { return !(*this == other); }
+
+  /// Sets child `name` to `value` of type T (bool, long long or std::string): assigns to the first
+  /// child of that name, keeping its place, or appends a new child at the end. Returns the child.
+  /// Throws MethodIsNotApplicable naming "SetChildT" when this node is not a container; nothing
+  /// changes then.
+  template <class T>
+  Property& SetChildT(const std::string& name, const T& value);
+
+  /// Appends a child `name` holding `value` of type T (bool, long long or std::string), even when
+  /// a child of that name exists already. Returns the new child. Throws MethodIsNotApplicable
+  /// naming "CreateChildT" when this node is not a container; nothing changes then.
+  template <class T>
+  Property& CreateChildT(const std::string& name, const T& value);
+
+ private:
+  using Value = std::variant<std::monostate, bool, long long, std::string>;
+
+  // The refusal of the child helpers, with the items naming this node and `method` attached.
+  MethodIsNotApplicable NotApplicableError(const char* method) const;
+  [[noreturn]] void ThrowNotApplicable(const char* method, int line, const char* function) const;
+  [[noreturn]] void ThrowWrongType(PropertyTypes requested, const char* method, int line,
+                                   const char* function) const;
+  [[noreturn]] void ThrowChildNotFound(const std::string& key, int line,
+                                       const char* function) const;
+
+  std::string name_;
+  Value value_;
+  Children children_;
+};
+
+/// Prints `property` to `out` for a person to read: one line a node, "name (type)" for
+/// containers and "name (type): value" for leaves, indented by two spaces a level starting at
+/// `indent` levels. Strings are quoted, with quotes, backslashes and control bytes escaped;
+/// an empty name shows as "<unnamed>". Without `showTypes` the "(type)" parts are left out;
+/// without `recursive` only the node itself is printed.
+TARVEK_CORE_API void PrintPropertyValue(const Property& property, int indent, std::ostream& out,
+                                        bool showTypes, bool recursive);
+
+namespace Detail {
+
+/// Throw-location texts of the typed child helpers, the same on every compiler and machine.
+template <class T>
+struct ChildTSignature;  // defined only for the three value types a property can hold
+
+template <>
+struct ChildTSignature<bool> {
+  static constexpr const char* kSet =
+      "Tarvek::Core::Property &Tarvek::Core::Property::SetChildT(const std::string &, const bool "
+      "&)";
+  static constexpr const char* kCreate =
+      "Tarvek::Core::Property &Tarvek::Core::Property::CreateChildT(const std::string &, const "
+      "bool &)";
+};
+
+template <>
+struct ChildTSignature<long long> {
+  static constexpr const char* kSet =
+      "Tarvek::Core::Property &Tarvek::Core::Property::SetChildT(const std::string &, const long "
+      "long &)";
+  static constexpr const char* kCreate =
+      "Tarvek::Core::Property &Tarvek::Core::Property::CreateChildT(const std::string &, const "
+      "long long &)";
+};
+
+template <>
+struct ChildTSignature<std::string> {
+  static constexpr const char* kSet =
+      "Tarvek::Core::Property &Tarvek::Core::Property::SetChildT(const std::string &, const "
+      "std::basic_string<char> &)";
+  static constexpr const char* kCreate =
+      "Tarvek::Core::Property &Tarvek::Core::Property::CreateChildT(const std::string &, const "
+      "std::basic_string<char> &)";
+};
+
+/// The file recorded as the throw location of the typed child helpers.
+constexpr const char* kPropertyHeader = "Core/Interfaces/Property.h";
+
+}  // namespace Detail
+
+// The typed child helpers are defined here, inline, and their refusals are recorded at the lines
+// of this header on which they throw; keep the two throw statements where they are.
+// The library exports one instance of each helper per value type; users link those.
+extern template TARVEK_FORMATS_API Property& Property::SetChildT<bool>(const std::string&,
+                                                                       const bool&);
+extern template TARVEK_FORMATS_API Property& Property::SetChildT<long long>(const std::string&,
+                                                                            const long long&);
+extern template TARVEK_FORMATS_API Property& Property::SetChildT<std::string>(const std::string&,
+                                                                              const std::string&);
+extern template TARVEK_FORMATS_API Property& Property::CreateChildT<bool>(const std::string&,
+                                                                          const bool&);
+extern template TARVEK_FORMATS_API Property& Property::CreateChildT<long long>(const std::string&,
+                                                                               const long long&);
+extern template TARVEK_FORMATS_API Property& Property::CreateChildT<std::string>(
+    const std::string&, const std::string&);
+
+template <class T>
+Property& Property::CreateChildT(const std::string& name, const T& value) {
+  if (GetType() != PropertyTypeContainer) {
+    ThrowWithLocation(__LINE__, Detail::kPropertyHeader, Detail::ChildTSignature<T>::kCreate,
+                      AddStack(NotApplicableError("CreateChildT")));
+  }
+  return children_.emplace_back(name, value);
+}
+
+// SetChildT checks the type itself rather than leaving it to CreateChildT, so that a refusal
+// always names the helper the caller called. An existing child keeps its place among its
+// siblings and is retyped by assignment; only a missing one is appended.
+template <class T>
+Property& Property::SetChildT(const std::string& name, const T& value) {
+  if (GetType() != PropertyTypeContainer) {
+    ThrowWithLocation(__LINE__, Detail::kPropertyHeader, Detail::ChildTSignature<T>::kSet,
+                      AddStack(NotApplicableError("SetChildT")));
+  }
+  const iterator found = FindChild(name);
+  if (found != children_.end()) {
+    *found = value;
+    return *found;
+  }
+  return CreateChildT<T>(name, value);
+}
+
+}  // namespace Core
+}  // namespace Tarvek
+
+#endif  // TARVEK_CORE_INTERFACES_PROPERTY_H_
