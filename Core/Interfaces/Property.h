@@ -8,7 +8,27 @@
 //   Tarvek::Core::Property tree("settings");
 //   tree.SetChildT<long long>("width", 1920);
 //   tree.SetChildT<std::string>("codec_id", "h264");
-//   long long width = tree["width"].GetInt64();   // const look-up throws ChildNotFound if absent
+//   const Tarvek::Core::Property& view = tree;
+//   long long width = view["width"].GetInt64();
+//
+// Reading. The const operator[] never changes the tree: a missing child throws ChildNotFound,
+// and a typed getter on a node of another type throws WrongPropertyType. Test with ChildExists
+// first where absence is normal; the errors carry the names involved and the call stack.
+//
+// Writing. SetChildT overwrites the first child of a name in place or appends one; CreateChildT
+// always appends. SetChild does the same for whole sub-trees. The non-const operator[] appends
+// an empty container child when the name is missing, so use it only to write.
+//
+// Assignment. Assigning a Property copies type, value and children but keeps the target's name,
+// so a sub-tree can be replaced under its key; moving takes the name too. Assigning a plain value
+// turns the node into a leaf and drops its children.
+//
+// Errors. Adding a child to a leaf throws MethodIsNotApplicable, and nothing changes. Every
+// error derives from Tarvek::Core::PropertyException; boost::diagnostic_information() prints
+// its items, the call stack and the throw location.
+//
+// Threads. A tree is a plain value: any number of threads may read one that nobody writes;
+// writers need a lock of the caller's.
 #ifndef TARVEK_CORE_INTERFACES_PROPERTY_H_
 #define TARVEK_CORE_INTERFACES_PROPERTY_H_
 
@@ -209,6 +229,11 @@ extern template TARVEK_FORMATS_API Property& Property::CreateChildT<long long>(c
 extern template TARVEK_FORMATS_API Property& Property::CreateChildT<std::string>(
     const std::string&, const std::string&);
 
+// CreateChildT constructs the child in place at the end of the list: nothing is looked up, so a
+// name that is present already gets a second child after the others. If construction fails, the
+// list is left as it was. It is the building block of SetChildT and is exported for callers that
+// build trees with repeated names, such as lists of entries; a refusal leaves the node as it
+// was.
 template <class T>
 Property& Property::CreateChildT(const std::string& name, const T& value) {
   if (GetType() != PropertyTypeContainer) {
@@ -220,7 +245,12 @@ Property& Property::CreateChildT(const std::string& name, const T& value) {
 
 // SetChildT checks the type itself rather than leaving it to CreateChildT, so that a refusal
 // always names the helper the caller called. An existing child keeps its place among its
-// siblings and is retyped by assignment; only a missing one is appended.
+// siblings, and references to it stay valid; it is retyped by assignment when it held another
+// type (a string written over an int64 leaf makes a string leaf). Only a missing child is
+// appended, as the last one. With several children of the name, the first is the one set.
+// Either way the returned reference is to the child that now holds the value, valid until the
+// child itself is removed.
+// Like CreateChildT, a refusal leaves the node and its children exactly as they were.
 template <class T>
 Property& Property::SetChildT(const std::string& name, const T& value) {
   if (GetType() != PropertyTypeContainer) {

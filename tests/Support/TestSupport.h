@@ -1,0 +1,92 @@
+// Shared helpers of the unit tests: catching an expected error to inspect its items, capturing
+// standard output, and a blob that counts its live instances.
+#ifndef TARVEK_TESTS_SUPPORT_TESTSUPPORT_H_
+#define TARVEK_TESTS_SUPPORT_TESTSUPPORT_H_
+
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <cstddef>
+#include <cstdint>
+#include <functional>
+#include <iostream>
+#include <optional>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include <Tarvek/Formats.h>
+
+namespace TarvekTest {
+
+// Runs `call` and returns the error of type E it throws; fails the test (and returns nothing)
+// when it throws nothing or something else.
+template <class E>
+std::optional<E> CatchAs(const std::function<void()>& call) {
+  try {
+    call();
+  } catch (const E& e) {
+    return e;
+  } catch (...) {
+    ADD_FAILURE() << "threw an error of another type";
+    return std::nullopt;
+  }
+  ADD_FAILURE() << "threw nothing";
+  return std::nullopt;
+}
+
+// Returns the value of error-info item Info on `e`, or nothing when the item is absent.
+template <class Info, class E>
+std::optional<typename Info::value_type> ItemOf(const E& e) {
+  if (const auto* value = boost::get_error_info<Info>(e)) return *value;
+  return std::nullopt;
+}
+
+// Redirects std::cout into a string for its lifetime.
+class CaptureStdout {
+ public:
+  CaptureStdout() : previous_(std::cout.rdbuf(buffer_.rdbuf())) {}
+  ~CaptureStdout() { std::cout.rdbuf(previous_); }
+  CaptureStdout(const CaptureStdout&) = delete;
+  CaptureStdout& operator=(const CaptureStdout&) = delete;
+
+  std::string Text() const { return buffer_.str(); }
+
+ private:
+  std::ostringstream buffer_;
+  std::streambuf* previous_;
+};
+
+// A blob that counts live instances, to prove that holders release what they hold.
+class CountingBlob final : public Tarvek::IBlob {
+ public:
+  static std::atomic<int>& Live() {
+    static std::atomic<int> live{0};
+    return live;
+  }
+
+  static boost::intrusive_ptr<CountingBlob> Create() {
+    return boost::intrusive_ptr<CountingBlob>(new CountingBlob);
+  }
+
+  int AddRef() const override { return count_.AddRefImpl(); }
+  int GetRefCount() const override { return count_.GetRefCountImpl(); }
+  int Release() const override {
+    const int left = count_.ReleaseImpl();
+    if (left == 0) delete this;
+    return left;
+  }
+  const std::uint8_t* GetData() const override { return bytes_; }
+  std::size_t GetSize() const override { return sizeof bytes_; }
+
+ private:
+  CountingBlob() { ++Live(); }
+  ~CountingBlob() override { --Live(); }
+
+  Tarvek::RefCountImpl count_;
+  std::uint8_t bytes_[4] = {1, 2, 3, 4};
+};
+
+}  // namespace TarvekTest
+
+#endif  // TARVEK_TESTS_SUPPORT_TESTSUPPORT_H_
