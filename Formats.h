@@ -31,5 +31,8 @@
 
 #include "Conf/Formats/FormatBase.h"
 #include "Conf/Formats/FormatCodec.h"
+#include "Conf/Formats/FormatCodecAudio.h"
+#include "Conf/Formats/FormatCodecSubtitle.h"
+#include "Conf/Formats/FormatCodecVideo.h"
 
 #endif  // TARVEK_FORMATS_H_

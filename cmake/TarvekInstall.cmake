@@ -4,7 +4,8 @@ include(CMakePackageConfigHelpers)
 
 set(TARVEK_CMAKE_DIR "${CMAKE_INSTALL_LIBDIR}/cmake/TarvekFormats")
 
-install(TARGETS TarvekAVUtilHeaders TarvekCore TarvekConfInterfaces TarvekFormats
+install(TARGETS TarvekAVUtilHeaders TarvekCore TarvekConfInterfaces TarvekMediaWrapper
+                TarvekFormats
         EXPORT TarvekFormatsTargets
         LIBRARY DESTINATION "${CMAKE_INSTALL_LIBDIR}"
         ARCHIVE DESTINATION "${CMAKE_INSTALL_LIBDIR}"
@@ -12,6 +13,8 @@ install(TARGETS TarvekAVUtilHeaders TarvekCore TarvekConfInterfaces TarvekFormat
 
 install(FILES "${PROJECT_SOURCE_DIR}/Formats.h"
         DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}/Tarvek")
+install(FILES "${PROJECT_SOURCE_DIR}/platform/MediaWrapper/Reduce.h"
+        DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}/Tarvek/MediaWrapper")
 foreach(dir Core/Interfaces Core/Errors Conf/Interfaces Conf/Formats)
   install(DIRECTORY "${PROJECT_SOURCE_DIR}/${dir}/"
           DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}/Tarvek/${dir}"

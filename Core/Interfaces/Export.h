@@ -30,6 +30,13 @@
 #define TARVEK_CONF_INTERFACES_API TARVEK_DECL_IMPORT
 #endif
 
+// Media wrapper library: rational arithmetic (Tarvek::MediaWrapper).
+#if defined(TARVEK_MEDIA_WRAPPER_BUILDING)
+#define TARVEK_MEDIA_WRAPPER_API TARVEK_DECL_EXPORT
+#else
+#define TARVEK_MEDIA_WRAPPER_API TARVEK_DECL_IMPORT
+#endif
+
 // Format description library (Tarvek::Formats).
 #if defined(TARVEK_FORMATS_BUILDING)
 #define TARVEK_FORMATS_API TARVEK_DECL_EXPORT

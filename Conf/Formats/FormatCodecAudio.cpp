@@ -1,0 +1,96 @@
+#include "FormatCodecAudio.h"
+
+namespace Tarvek {
+namespace Conf {
+namespace {
+
+int LowBits(long long value) { return static_cast<int>(value); }
+
+}  // namespace
+
+boost::intrusive_ptr<IFormatCodecAudio> FormatCodecAudio::Create() {
+  return boost::intrusive_ptr<IFormatCodecAudio>(new FormatCodecAudio());
+}
+
+FormatCodecAudio::FormatCodecAudio()
+    : FormatBase(TAG_FORMAT_CODEC_AUDIO), FormatCodec(TAG_FORMAT_CODEC_AUDIO) {}
+
+FormatCodecAudio::FormatCodecAudio(const FormatCodecAudio& source)
+    : IRefCountable(),
+      IFormat(),
+      IFormatCodec(),
+      IFormatCodecAudio(),
+      FormatBase(TAG_FORMAT_CODEC_AUDIO),
+      FormatCodec(TAG_FORMAT_CODEC_AUDIO) {
+  CopyTreesFrom(source);
+}
+
+FormatCodecAudio::~FormatCodecAudio() = default;
+
+int FormatCodecAudio::GetCodecType() const { return 1; }
+
+bool FormatCodecAudio::IsCompatible(boost::intrusive_ptr<const IFormat> other) const {
+  // `other` holds a reference for the whole call, released on every way out.
+  const auto* audio = dynamic_cast<const IFormatCodecAudio*>(other.get());
+  if (audio == nullptr) return false;
+  return GetSampleRate() == audio->GetSampleRate() &&
+         GetChannelLayout() == audio->GetChannelLayout() &&
+         GetSampleFormat() == audio->GetSampleFormat();
+}
+
+const Core::Property* FormatCodecAudio::FindLanguage() const {
+  const auto metadata = property_.FindChild(TAG_METADATA);
+  if (metadata == property_.GetChildren().end()) return nullptr;
+  const auto language = metadata->FindChild(TAG_LANGUAGE);
+  if (language == metadata->GetChildren().end()) return nullptr;
+  return &*language;
+}
+
+std::string FormatCodecAudio::GetLanguage() const {
+  const Core::Property* language = FindLanguage();
+  return language == nullptr ? std::string() : language->GetString();
+}
+bool FormatCodecAudio::ExistsLanguage() const { return FindLanguage() != nullptr; }
+void FormatCodecAudio::SetLanguage(const std::string& language) {
+  property_[TAG_METADATA].SetChildT<std::string>(TAG_LANGUAGE, language);
+}
+
+int FormatCodecAudio::GetSampleRate() const {
+  return LowBits(property_[TAG_SAMPLE_RATE].GetInt64());
+}
+bool FormatCodecAudio::ExistsSampleRate() const { return property_.ChildExists(TAG_SAMPLE_RATE); }
+void FormatCodecAudio::SetSampleRate(int sampleRate) {
+  property_.SetChildT<long long>(TAG_SAMPLE_RATE, sampleRate);
+}
+
+ChannelLayout FormatCodecAudio::GetChannelLayout() const {
+  return static_cast<ChannelLayout>(static_cast<std::uint32_t>(property_[TAG_LAYOUT].GetInt64()));
+}
+bool FormatCodecAudio::ExistsChannelLayout() const { return property_.ChildExists(TAG_LAYOUT); }
+void FormatCodecAudio::SetChannelLayout(ChannelLayout layout) {
+  // Zero extension: every mask is stored as the positive number it is.
+  property_.SetChildT<long long>(TAG_LAYOUT, static_cast<std::uint32_t>(layout));
+}
+
+int FormatCodecAudio::GetFrameSize() const { return LowBits(property_[TAG_FRAME_SIZE].GetInt64()); }
+bool FormatCodecAudio::ExistsFrameSize() const { return property_.ChildExists(TAG_FRAME_SIZE); }
+void FormatCodecAudio::SetFrameSize(int frameSize) {
+  property_.SetChildT<long long>(TAG_FRAME_SIZE, frameSize);
+}
+
+AVSampleFormat FormatCodecAudio::GetSampleFormat() const {
+  return static_cast<AVSampleFormat>(LowBits(property_[TAG_SAMPLE_FORMAT].GetInt64()));
+}
+bool FormatCodecAudio::ExistsSampleFormat() const {
+  return property_.ChildExists(TAG_SAMPLE_FORMAT);
+}
+void FormatCodecAudio::SetSampleFormat(AVSampleFormat format) {
+  property_.SetChildT<long long>(TAG_SAMPLE_FORMAT, static_cast<long long>(format));
+}
+
+boost::intrusive_ptr<IFormatCodecAudio> FormatCodecAudio::Clone() const {
+  return boost::intrusive_ptr<IFormatCodecAudio>(new FormatCodecAudio(*this));
+}
+
+}  // namespace Conf
+}  // namespace Tarvek

@@ -1,0 +1,184 @@
+#include "FormatCodecVideo.h"
+
+#include <cstdint>
+#include <limits>
+#include <numeric>
+
+#include <Tarvek/MediaWrapper/Reduce.h>
+
+namespace Tarvek {
+namespace Conf {
+namespace {
+
+unsigned int LowBits(long long value) { return static_cast<unsigned int>(value); }
+
+// Reduces (a x b) : (c x d) to lowest terms. The products are exact in 64 bits, so a large
+// size times a large aspect term no longer wraps; a reduced term beyond 32 bits keeps its low
+// 32 bits, the most the interface can return.
+void ReduceProducts(unsigned int a, unsigned int b, unsigned int c, unsigned int d, unsigned int& x,
+                    unsigned int& y) {
+  std::uint64_t px = std::uint64_t{a} * b;
+  std::uint64_t py = std::uint64_t{c} * d;
+  constexpr auto kSignedMax = static_cast<std::uint64_t>(std::numeric_limits<long long>::max());
+  if (px <= kSignedMax && py <= kSignedMax) {
+    long long sx = static_cast<long long>(px);
+    long long sy = static_cast<long long>(py);
+    Media::reduce(sx, sy);
+    px = static_cast<std::uint64_t>(sx);
+    py = static_cast<std::uint64_t>(sy);
+  } else {
+    // Beyond the signed range of reduce (both factors near 2^32): divide out the common
+    // divisor here. Not both products are 0 on this path, so the divisor is not 0.
+    const std::uint64_t divisor = std::gcd(px, py);
+    px /= divisor;
+    py /= divisor;
+  }
+  x = static_cast<unsigned int>(px);
+  y = static_cast<unsigned int>(py);
+}
+
+}  // namespace
+
+boost::intrusive_ptr<IFormatCodecVideo> FormatCodecVideo::Create() {
+  return boost::intrusive_ptr<IFormatCodecVideo>(new FormatCodecVideo());
+}
+
+FormatCodecVideo::FormatCodecVideo()
+    : FormatBase(TAG_FORMAT_CODEC_VIDEO), FormatCodec(TAG_FORMAT_CODEC_VIDEO) {}
+
+FormatCodecVideo::FormatCodecVideo(const FormatCodecVideo& source)
+    : IRefCountable(),
+      IFormat(),
+      IFormatCodec(),
+      IFormatCodecVideo(),
+      FormatBase(TAG_FORMAT_CODEC_VIDEO),
+      FormatCodec(TAG_FORMAT_CODEC_VIDEO) {
+  CopyTreesFrom(source);
+}
+
+FormatCodecVideo::~FormatCodecVideo() = default;
+
+int FormatCodecVideo::GetCodecType() const { return 0; }
+
+bool FormatCodecVideo::IsCompatible(boost::intrusive_ptr<const IFormat> other) const {
+  // `other` holds a reference for the whole call, released on every way out.
+  const auto* video = dynamic_cast<const IFormatCodecVideo*>(other.get());
+  if (video == nullptr) return false;
+  return GetWidth() == video->GetWidth() && GetHeight() == video->GetHeight() &&
+         GetPixelAspectX() == video->GetPixelAspectX() &&
+         GetPixelAspectY() == video->GetPixelAspectY();
+}
+
+unsigned int FormatCodecVideo::GetWidth() const { return LowBits(property_[TAG_WIDTH].GetInt64()); }
+bool FormatCodecVideo::ExistsWidth() const { return property_.ChildExists(TAG_WIDTH); }
+void FormatCodecVideo::SetWidth(unsigned int width) {
+  property_.SetChildT<long long>(TAG_WIDTH, width);
+}
+
+unsigned int FormatCodecVideo::GetHeight() const {
+  return LowBits(property_[TAG_HEIGHT].GetInt64());
+}
+bool FormatCodecVideo::ExistsHeight() const { return property_.ChildExists(TAG_HEIGHT); }
+void FormatCodecVideo::SetHeight(unsigned int height) {
+  property_.SetChildT<long long>(TAG_HEIGHT, height);
+}
+
+unsigned int FormatCodecVideo::GetPixelAspectX() const {
+  return LowBits(property_[TAG_ASPECTX].GetInt64());
+}
+bool FormatCodecVideo::ExistsPixelAspectX() const { return property_.ChildExists(TAG_ASPECTX); }
+void FormatCodecVideo::SetPixelAspectX(unsigned int aspectX) {
+  property_.SetChildT<long long>(TAG_ASPECTX, aspectX);
+}
+
+unsigned int FormatCodecVideo::GetPixelAspectY() const {
+  return LowBits(property_[TAG_ASPECTY].GetInt64());
+}
+bool FormatCodecVideo::ExistsPixelAspectY() const { return property_.ChildExists(TAG_ASPECTY); }
+void FormatCodecVideo::SetPixelAspectY(unsigned int aspectY) {
+  property_.SetChildT<long long>(TAG_ASPECTY, aspectY);
+}
+
+void FormatCodecVideo::ReadFrameAspect(unsigned int& x, unsigned int& y) const {
+  const unsigned int aspectX = GetPixelAspectX();
+  const unsigned int width = GetWidth();
+  const unsigned int aspectY = GetPixelAspectY();
+  const unsigned int height = GetHeight();
+  ReduceProducts(width, aspectX, height, aspectY, x, y);
+}
+
+unsigned int FormatCodecVideo::GetFrameAspectX() const {
+  unsigned int x = 0;
+  unsigned int y = 0;
+  ReadFrameAspect(x, y);
+  return x;
+}
+
+unsigned int FormatCodecVideo::GetFrameAspectY() const {
+  unsigned int x = 0;
+  unsigned int y = 0;
+  ReadFrameAspect(x, y);
+  return y;
+}
+
+double FormatCodecVideo::GetFrameAspect() const {
+  return static_cast<double>(GetFrameAspectX()) / static_cast<double>(GetFrameAspectY());
+}
+
+unsigned int FormatCodecVideo::GetFrameRateNum() const {
+  return LowBits(property_[TAG_TIMEBASE_N].GetInt64());
+}
+bool FormatCodecVideo::ExistsFrameRateNum() const { return property_.ChildExists(TAG_TIMEBASE_N); }
+void FormatCodecVideo::SetFrameRateNum(unsigned int numerator) {
+  property_.SetChildT<long long>(TAG_TIMEBASE_N, numerator);
+}
+
+unsigned int FormatCodecVideo::GetFrameRateDen() const {
+  return LowBits(property_[TAG_TIMEBASE_D].GetInt64());
+}
+bool FormatCodecVideo::ExistsFrameRateDen() const { return property_.ChildExists(TAG_TIMEBASE_D); }
+void FormatCodecVideo::SetFrameRateDen(unsigned int denominator) {
+  property_.SetChildT<long long>(TAG_TIMEBASE_D, denominator);
+}
+
+double FormatCodecVideo::GetFrameRate() const {
+  const unsigned int denominator = GetFrameRateDen();
+  if (denominator == 0) return 0.0;
+  return static_cast<double>(GetFrameRateNum()) / static_cast<double>(denominator);
+}
+
+AVPixelFormat FormatCodecVideo::GetPixelFormat() const {
+  return static_cast<AVPixelFormat>(static_cast<int>(property_[TAG_PIX_FMT].GetInt64()));
+}
+bool FormatCodecVideo::ExistsPixelFormat() const { return property_.ChildExists(TAG_PIX_FMT); }
+void FormatCodecVideo::SetPixelFormat(AVPixelFormat format) {
+  property_.SetChildT<long long>(TAG_PIX_FMT, static_cast<long long>(format));
+}
+
+void FormatCodecVideo::SetFrameRate(unsigned int numerator, unsigned int denominator) {
+  SetFrameRateNum(numerator);
+  SetFrameRateDen(denominator);
+}
+
+void FormatCodecVideo::InitByPixelAspect(unsigned int width, unsigned int height,
+                                         unsigned int aspectX, unsigned int aspectY) {
+  SetWidth(width);
+  SetHeight(height);
+  SetPixelAspectX(aspectX);
+  SetPixelAspectY(aspectY);
+}
+
+void FormatCodecVideo::InitByFrameAspect(unsigned int width, unsigned int height,
+                                         unsigned int frameAspectX, unsigned int frameAspectY) {
+  unsigned int aspectX = 0;
+  unsigned int aspectY = 0;
+  ReduceProducts(frameAspectX, height, frameAspectY, width, aspectX, aspectY);
+  InitByPixelAspect(width, height, aspectX, aspectY);
+}
+
+boost::intrusive_ptr<IFormatCodecVideo> FormatCodecVideo::Clone() const {
+  return boost::intrusive_ptr<IFormatCodecVideo>(new FormatCodecVideo(*this));
+}
+
+}  // namespace Conf
+}  // namespace Tarvek
