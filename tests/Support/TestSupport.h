@@ -16,6 +16,7 @@
 #include <vector>
 
 #include <Tarvek/Formats.h>
+#include <boost/exception/get_error_info.hpp>
 
 namespace TarvekTest {
 
