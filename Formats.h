@@ -29,10 +29,13 @@
 #include "Conf/Interfaces/IFormatCodecVideo.h"
 #include "Conf/Interfaces/IFormatFile.h"
 
+#include "Conf/Formats/BitrateCalculator.h"
 #include "Conf/Formats/FormatBase.h"
 #include "Conf/Formats/FormatCodec.h"
 #include "Conf/Formats/FormatCodecAudio.h"
 #include "Conf/Formats/FormatCodecSubtitle.h"
 #include "Conf/Formats/FormatCodecVideo.h"
+
+#include <Tarvek/Presets/BitratePresets.h>
 
 #endif  // TARVEK_FORMATS_H_

@@ -5,7 +5,7 @@ include(CMakePackageConfigHelpers)
 set(TARVEK_CMAKE_DIR "${CMAKE_INSTALL_LIBDIR}/cmake/TarvekFormats")
 
 install(TARGETS TarvekAVUtilHeaders TarvekCore TarvekConfInterfaces TarvekMediaWrapper
-                TarvekFormats
+                TarvekPresets TarvekFormats
         EXPORT TarvekFormatsTargets
         LIBRARY DESTINATION "${CMAKE_INSTALL_LIBDIR}"
         ARCHIVE DESTINATION "${CMAKE_INSTALL_LIBDIR}"
@@ -15,6 +15,8 @@ install(FILES "${PROJECT_SOURCE_DIR}/Formats.h"
         DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}/Tarvek")
 install(FILES "${PROJECT_SOURCE_DIR}/platform/MediaWrapper/Reduce.h"
         DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}/Tarvek/MediaWrapper")
+install(FILES "${PROJECT_SOURCE_DIR}/platform/Presets/BitratePresets.h"
+        DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}/Tarvek/Presets")
 foreach(dir Core/Interfaces Core/Errors Conf/Interfaces Conf/Formats)
   install(DIRECTORY "${PROJECT_SOURCE_DIR}/${dir}/"
           DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}/Tarvek/${dir}"

@@ -37,6 +37,13 @@
 #define TARVEK_MEDIA_WRAPPER_API TARVEK_DECL_IMPORT
 #endif
 
+// Presets library: bitrate look-ups by codec (Tarvek::Presets).
+#if defined(TARVEK_PRESETS_BUILDING)
+#define TARVEK_PRESETS_API TARVEK_DECL_EXPORT
+#else
+#define TARVEK_PRESETS_API TARVEK_DECL_IMPORT
+#endif
+
 // Format description library (Tarvek::Formats).
 #if defined(TARVEK_FORMATS_BUILDING)
 #define TARVEK_FORMATS_API TARVEK_DECL_EXPORT
