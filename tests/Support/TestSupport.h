@@ -18,6 +18,19 @@
 #include <Tarvek/Formats.h>
 #include <boost/exception/get_error_info.hpp>
 
+namespace Tarvek {
+namespace Core {
+
+// Lets GoogleTest show a failed comparison of two trees as the printed trees instead of their
+// bytes (found by argument-dependent lookup).
+inline void PrintTo(const Property& property, std::ostream* out) {
+  *out << '\n';
+  PrintPropertyValue(property, 1, *out, true, true);
+}
+
+}  // namespace Core
+}  // namespace Tarvek
+
 namespace TarvekTest {
 
 // Runs `call` and returns the error of type E it throws; fails the test (and returns nothing)

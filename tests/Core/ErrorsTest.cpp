@@ -1,0 +1,160 @@
+// The error classes: catching through every base, the items the library attaches, how they
+// render, capture with boost::current_exception, and the call stack text.
+#include <boost/exception/diagnostic_information.hpp>
+#include <boost/exception_ptr.hpp>
+#include <exception>
+#include <functional>
+#include <optional>
+#include <string>
+
+#include <Tarvek/Formats.h>
+#include "Support/TestSupport.h"
+
+namespace {
+
+using Tarvek::Core::MethodIsNotApplicable;
+using Tarvek::Core::Property;
+using Tarvek::Core::PropertyException;
+using TarvekTest::CatchAs;
+using TarvekTest::ItemOf;
+
+std::exception_ptr Thrown(const std::function<void()>& call) {
+  try {
+    call();
+  } catch (...) {
+    return std::current_exception();
+  }
+  return nullptr;
+}
+
+// The refusal of SetChildT on a string leaf named "label".
+std::exception_ptr Refusal() {
+  return Thrown([] {
+    Property leaf("label", "value");
+    leaf.SetChildT<long long>("child", 1);
+  });
+}
+
+constexpr int kConfThrowLine = 321;
+
+// A ConfException built and thrown the way the library's throw sites do it.
+std::exception_ptr ConfError() {
+  return Thrown([] {
+    Tarvek::ThrowWithLocation(
+        kConfThrowLine, "Conf/Formats/Somewhere.cpp", "void Somewhere()",
+        Tarvek::AddStack(Tarvek::Conf::ConfException() << Tarvek::DescriptionInfo("wrong kind")));
+  });
+}
+
+template <class E>
+std::optional<E> As(const std::exception_ptr& error) {
+  return CatchAs<E>([&] { std::rethrow_exception(error); });
+}
+
+// The address of the complete object that `error` is caught as through Base; null when Base does
+// not catch it.
+template <class Base>
+const void* CaughtAs(const std::exception_ptr& error) {
+  try {
+    std::rethrow_exception(error);
+  } catch (const Base& e) {
+    return dynamic_cast<const void*>(&e);
+  } catch (...) {
+  }
+  return nullptr;
+}
+
+TEST(ErrorsTest, MethodIsNotApplicableIsOneObjectThroughEveryBase) {
+  const std::exception_ptr error = Refusal();
+  const void* object = CaughtAs<MethodIsNotApplicable>(error);
+  ASSERT_NE(object, nullptr);
+  EXPECT_EQ(CaughtAs<PropertyException>(error), object);
+  EXPECT_EQ(CaughtAs<Tarvek::Core::CoreException>(error), object);
+  EXPECT_EQ(CaughtAs<Tarvek::Exception>(error), object);
+  EXPECT_EQ(CaughtAs<boost::exception>(error), object);
+  EXPECT_EQ(CaughtAs<std::exception>(error), object);
+}
+
+TEST(ErrorsTest, MethodIsNotApplicableCarriesStackButNoDescription) {
+  const auto error = As<MethodIsNotApplicable>(Refusal());
+  ASSERT_TRUE(error);
+  EXPECT_FALSE(ItemOf<Tarvek::CallStackInfo>(*error).value_or("").empty());
+  EXPECT_FALSE(ItemOf<Tarvek::DescriptionInfo>(*error));
+}
+
+TEST(ErrorsTest, ConfExceptionIsNotACoreError) {
+  const std::exception_ptr error = ConfError();
+  const void* object = CaughtAs<Tarvek::Conf::ConfException>(error);
+  ASSERT_NE(object, nullptr);
+  EXPECT_EQ(CaughtAs<Tarvek::Exception>(error), object);
+  EXPECT_EQ(CaughtAs<boost::exception>(error), object);
+  EXPECT_EQ(CaughtAs<std::exception>(error), object);
+  EXPECT_EQ(CaughtAs<Tarvek::Core::CoreException>(error), nullptr);
+}
+
+TEST(ErrorsTest, ThrowWithLocationRecordsLocationAndItems) {
+  const auto error = As<Tarvek::Conf::ConfException>(ConfError());
+  ASSERT_TRUE(error);
+  EXPECT_EQ(ItemOf<Tarvek::DescriptionInfo>(*error), "wrong kind");
+  EXPECT_FALSE(ItemOf<Tarvek::CallStackInfo>(*error).value_or("").empty());
+  EXPECT_FALSE(ItemOf<PropertyException::PropertyNameInfo>(*error));
+  const int* line = boost::get_error_info<boost::throw_line>(*error);
+  const char* const* file = boost::get_error_info<boost::throw_file>(*error);
+  const char* const* function = boost::get_error_info<boost::throw_function>(*error);
+  ASSERT_TRUE(line && file && function);
+  EXPECT_EQ(*line, kConfThrowLine);
+  EXPECT_STREQ(*file, "Conf/Formats/Somewhere.cpp");
+  EXPECT_STREQ(*function, "void Somewhere()");
+}
+
+// The diagnostic line of the PropertyTypeInfo item, or the whole text when there is none.
+std::string PropertyTypeLine(const boost::exception& error) {
+  const std::string text = boost::diagnostic_information(error);
+  const auto start = text.find("[Tarvek::Core::PropertyException::TagPropertyType");
+  if (start == std::string::npos) return text;
+  return text.substr(start, text.find('\n', start) - start);
+}
+
+TEST(ErrorsTest, PropertyTypeRendersAsDecimalDigits) {
+  const auto refused = As<MethodIsNotApplicable>(Refusal());
+  ASSERT_TRUE(refused);
+  EXPECT_EQ(PropertyTypeLine(*refused), "[Tarvek::Core::PropertyException::TagPropertyType*] = 3");
+
+  const Property root("root");
+  const auto missing = CatchAs<Tarvek::Core::ChildNotFound>([&] { (void)root["x"]; });
+  ASSERT_TRUE(missing);
+  EXPECT_EQ(PropertyTypeLine(*missing), "[Tarvek::Core::PropertyException::TagPropertyType*] = 6");
+}
+
+TEST(ErrorsTest, WhatOmitsDescriptionAndName) {
+  const Property node("zebra_node", 1);
+  const auto wrong = CatchAs<Tarvek::Core::WrongPropertyType>([&] { (void)node.GetString(); });
+  ASSERT_TRUE(wrong);
+  const auto description = ItemOf<Tarvek::DescriptionInfo>(*wrong);
+  ASSERT_TRUE(description);
+  const std::string what = wrong->what();
+  EXPECT_EQ(what.find(*description), std::string::npos) << what;
+  EXPECT_EQ(what.find("zebra_node"), std::string::npos) << what;
+}
+
+TEST(ErrorsTest, CurrentExceptionCapturesThrownError) {
+  boost::exception_ptr captured;
+  try {
+    Property leaf("label", true);
+    leaf.CreateChildT<bool>("child", false);
+  } catch (...) {
+    captured = boost::current_exception();
+  }
+  ASSERT_TRUE(captured);
+  const auto error = CatchAs<MethodIsNotApplicable>([&] { boost::rethrow_exception(captured); });
+  ASSERT_TRUE(error);
+  EXPECT_EQ(ItemOf<PropertyException::PropertyNameInfo>(*error), "label");
+  EXPECT_EQ(ItemOf<PropertyException::MethodNameInfo>(*error), "CreateChildT");
+}
+
+TEST(ErrorsTest, GetCallStackNamesTheCaller) {
+  const std::string stack = Tarvek::GetCallStack();
+  EXPECT_NE(stack.find("GetCallStackNamesTheCaller"), std::string::npos) << stack;
+}
+
+}  // namespace
