@@ -1,0 +1,2 @@
+// formatdesc: being written.
+int main() { return 0; }
