@@ -1,0 +1,303 @@
+// The bitrate presets: for every codec, min <= default <= max and growth with picture size,
+// frame rate, channel count and sample rate; spot values against the published figures; clamped
+// extreme inputs; and the errors for bad input.
+#include <Tarvek/Presets/BitratePresets.h>
+
+#include <algorithm>
+#include <cstdint>
+#include <limits>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "Support/TestSupport.h"
+
+namespace {
+
+using namespace Tarvek::Conf;  // the look-ups, their errors, ChannelLayout and CH_LAYOUT_*
+using Tarvek::DescriptionInfo;
+using TarvekTest::CatchAs;
+using TarvekTest::ItemOf;
+
+struct Trio {
+  std::int64_t min, def, max;
+};
+
+Trio Video(const std::string& id, long long w, long long h, double fps, int quality) {
+  return {GetMinVideoBitrate(id, w, h, fps, quality),
+          GetDefaultVideoBitrate(id, w, h, fps, quality),
+          GetMaxVideoBitrate(id, w, h, fps, quality)};
+}
+
+Trio Audio(const std::string& id, long long rate, ChannelLayout layout,
+           AVSampleFormat format = AV_SAMPLE_FMT_S16) {
+  return {GetMinAudioBitrate(id, rate, layout, format),
+          GetDefaultAudioBitrate(id, rate, layout, format),
+          GetMaxAudioBitrate(id, rate, layout, format)};
+}
+
+void ExpectOrdered(const Trio& t, const std::string& where) {
+  EXPECT_GT(t.min, 0) << where;
+  EXPECT_LE(t.min, t.def) << where;
+  EXPECT_LE(t.def, t.max) << where;
+}
+
+void ExpectNotBelow(const Trio& now, const Trio& before, const std::string& where) {
+  EXPECT_GE(now.min, before.min) << where;
+  EXPECT_GE(now.def, before.def) << where;
+  EXPECT_GE(now.max, before.max) << where;
+}
+
+// 16:9 sizes from a macroblock to beyond 8K, in ascending order.
+const std::vector<std::pair<long long, long long>> kSizes = {
+    {16, 9},      {176, 99},    {640, 360},   {854, 480},   {1280, 720},
+    {1920, 1080}, {2560, 1440}, {3840, 2160}, {7680, 4320}, {30720, 17280}};
+const std::vector<double> kFrameRates = {0.5, 1, 12, 23.976, 25, 29.97, 50, 60, 120, 240, 1000};
+const std::vector<int> kQualities = {-1, 0, 1, 4, 18, 23, 28, 31, 51, 63, 1000};
+
+// A mask of the first `channels` speaker bits.
+ChannelLayout Channels(int channels) {
+  return static_cast<ChannelLayout>(channels >= 32 ? 0xFFFFFFFFu : (1u << channels) - 1u);
+}
+
+// The description of the error E that `call` throws, empty when it throws something else.
+template <class E, class Call>
+std::string DescriptionOf(Call call) {
+  const auto error = CatchAs<E>(call);
+  return error ? ItemOf<DescriptionInfo>(*error).value_or("") : "";
+}
+
+class VideoPresetTest : public ::testing::TestWithParam<std::string> {};
+
+TEST_P(VideoPresetTest, MinDefaultMaxAreOrderedOverTheGrid) {
+  for (const auto& [w, h] : kSizes)
+    for (double fps : kFrameRates)
+      for (int q : kQualities)
+        ExpectOrdered(Video(GetParam(), w, h, fps, q), std::to_string(w) + "x" + std::to_string(h) +
+                                                           "@" + std::to_string(fps) + " q" +
+                                                           std::to_string(q));
+}
+
+TEST_P(VideoPresetTest, NeverFallsAsPicturesGrow) {
+  for (double fps : kFrameRates)
+    for (int q : kQualities)
+      for (std::size_t i = 1; i < kSizes.size(); ++i)
+        ExpectNotBelow(Video(GetParam(), kSizes[i].first, kSizes[i].second, fps, q),
+                       Video(GetParam(), kSizes[i - 1].first, kSizes[i - 1].second, fps, q),
+                       std::to_string(kSizes[i].first) + " wide @" + std::to_string(fps));
+}
+
+TEST_P(VideoPresetTest, NeverFallsAsFrameRateRises) {
+  for (const auto& [w, h] : kSizes)
+    for (int q : kQualities)
+      for (std::size_t i = 1; i < kFrameRates.size(); ++i)
+        ExpectNotBelow(Video(GetParam(), w, h, kFrameRates[i], q),
+                       Video(GetParam(), w, h, kFrameRates[i - 1], q),
+                       std::to_string(w) + " wide @" + std::to_string(kFrameRates[i]));
+}
+
+TEST_P(VideoPresetTest, AHigherQualityNumberNeverRaisesTheBitrate) {
+  for (std::size_t i = 2; i < kQualities.size(); ++i)  // from 0 up; -1 is "none"
+    EXPECT_LE(GetDefaultVideoBitrate(GetParam(), 1280, 720, 30, kQualities[i]),
+              GetDefaultVideoBitrate(GetParam(), 1280, 720, 30, kQualities[i - 1]))
+        << "q" << kQualities[i];
+}
+
+TEST_P(VideoPresetTest, UnknownFrameRateIsTakenAs30) {
+  const Trio unknown = Video(GetParam(), 1920, 1080, 0.0, -1);
+  const Trio nominal = Video(GetParam(), 1920, 1080, 30.0, -1);
+  EXPECT_EQ(unknown.min, nominal.min);
+  EXPECT_EQ(unknown.def, nominal.def);
+  EXPECT_EQ(unknown.max, nominal.max);
+}
+
+TEST_P(VideoPresetTest, ExtremeInputsAreClampedToTheLargestPictureAndRate) {
+  const long long huge = 4294967295LL;
+  const Trio extreme = Video(GetParam(), huge, huge, 1e300, std::numeric_limits<int>::max());
+  const Trio largest = Video(GetParam(), 65536, 65536, 240, std::numeric_limits<int>::max());
+  EXPECT_EQ(extreme.def, largest.def);
+  EXPECT_EQ(extreme.max, largest.max);
+  ExpectOrdered(extreme, "extreme");
+  EXPECT_LT(extreme.max, 100'000'000'000'000LL);  // far from overflow
+  EXPECT_EQ(GetDefaultVideoBitrate(GetParam(), 1280, 720, 1e-300, -1),
+            GetDefaultVideoBitrate(GetParam(), 1280, 720, 1.0, -1));
+}
+
+INSTANTIATE_TEST_SUITE_P(AllVideoCodecs, VideoPresetTest,
+                         ::testing::ValuesIn(GetPresetVideoCodecs()),
+                         [](const auto& info) { return info.param; });
+
+class AudioPresetTest : public ::testing::TestWithParam<std::string> {
+ protected:
+  // The channel counts 1..32 the codec carries; they must form one unbroken run.
+  std::vector<int> CarriedChannels() {
+    std::vector<int> carried;
+    for (int n = 1; n <= 32; ++n) {
+      try {
+        GetDefaultAudioBitrate(GetParam(), 48000, Channels(n), AV_SAMPLE_FMT_S16);
+        carried.push_back(n);
+      } catch (const InvalidPresetArgumentError&) {
+      }
+    }
+    EXPECT_FALSE(carried.empty());
+    if (!carried.empty()) {
+      EXPECT_EQ(carried.back() - carried.front() + 1, static_cast<int>(carried.size()));
+    }
+    return carried;
+  }
+};
+
+const std::vector<long long> kSampleRates = {8000,  11025, 16000, 22050, 24000, 32000,
+                                             44100, 48000, 88200, 96000, 192000};
+
+TEST_P(AudioPresetTest, MinDefaultMaxAreOrderedOverTheGrid) {
+  for (int n : CarriedChannels())
+    for (long long rate : kSampleRates)
+      ExpectOrdered(Audio(GetParam(), rate, Channels(n)),
+                    std::to_string(n) + " ch @" + std::to_string(rate));
+}
+
+TEST_P(AudioPresetTest, NeverFallsWithMoreChannels) {
+  const std::vector<int> carried = CarriedChannels();
+  for (long long rate : kSampleRates)
+    for (std::size_t i = 1; i < carried.size(); ++i)
+      ExpectNotBelow(Audio(GetParam(), rate, Channels(carried[i])),
+                     Audio(GetParam(), rate, Channels(carried[i - 1])),
+                     std::to_string(carried[i]) + " ch @" + std::to_string(rate));
+}
+
+TEST_P(AudioPresetTest, NeverFallsWithAHigherSampleRate) {
+  for (int n : CarriedChannels())
+    for (std::size_t i = 1; i < kSampleRates.size(); ++i)
+      ExpectNotBelow(Audio(GetParam(), kSampleRates[i], Channels(n)),
+                     Audio(GetParam(), kSampleRates[i - 1], Channels(n)),
+                     std::to_string(n) + " ch @" + std::to_string(kSampleRates[i]));
+}
+
+INSTANTIATE_TEST_SUITE_P(AllAudioCodecs, AudioPresetTest,
+                         ::testing::ValuesIn(GetPresetAudioCodecs()),
+                         [](const auto& info) { return info.param; });
+
+TEST(BitratePresetsTest, CodecListsAreSortedAndCoverTheCommonCodecs) {
+  const auto& video = GetPresetVideoCodecs();
+  const auto& audio = GetPresetAudioCodecs();
+  EXPECT_TRUE(std::is_sorted(video.begin(), video.end()));
+  EXPECT_TRUE(std::is_sorted(audio.begin(), audio.end()));
+  for (const char* id : {"h264", "hevc", "vp9", "av1", "mpeg2video", "mpeg4", "prores", "dnxhd"})
+    EXPECT_NE(std::find(video.begin(), video.end(), id), video.end()) << id;
+  for (const char* id : {"aac", "mp3", "opus", "vorbis", "ac3", "eac3", "flac", "alac", "pcm_s16le",
+                         "pcm_s24le", "pcm_f32le", "pcm_u8", "pcm_mulaw"})
+    EXPECT_NE(std::find(audio.begin(), audio.end(), id), audio.end()) << id;
+}
+
+TEST(BitratePresetsTest, VideoSpotValuesMatchThePublishedFigures) {
+  EXPECT_EQ(GetDefaultVideoBitrate("h264", 1920, 1080, 30, -1), 8'000'000);   // YT-UP 1080p 8
+  EXPECT_EQ(GetDefaultVideoBitrate("h264", 1920, 1080, 60, -1), 12'000'000);  // YT-UP 1080p60 12
+  EXPECT_EQ(GetDefaultVideoBitrate("h264", 1280, 720, 60, -1), 7'500'000);    // YT-UP 720p60 7.5
+  EXPECT_EQ(GetDefaultVideoBitrate("h264", 2560, 1440, 30, -1), 16'000'000);  // YT-UP 1440p 16
+  const std::int64_t between = GetDefaultVideoBitrate("h264", 1600, 900, 30, -1);
+  EXPECT_GT(between, 5'000'000);  // between the 720p and 1080p rungs
+  EXPECT_LT(between, 8'000'000);
+  const std::int64_t belowRung = GetDefaultVideoBitrate("h264", 1916, 1080, 30, -1);
+  EXPECT_GT(belowRung, 7'960'000);  // no jump below the 1080p rung
+  const std::int64_t uhd = GetDefaultVideoBitrate("h264", 3840, 2160, 30, -1);
+  EXPECT_GE(uhd, 35'000'000);  // YT-UP 2160p 35-45 Mbps
+  EXPECT_LE(uhd, 45'000'000);
+  const std::int64_t hevc = GetDefaultVideoBitrate("hevc", 1920, 1080, 30, -1);
+  EXPECT_GE(hevc, 4'500'000);  // HLS HEVC 1080p rungs 4500 and 5800 kbps
+  EXPECT_LE(hevc, 5'800'000);
+  // FF-264: +6 CRF halves the bitrate. NIST: MPEG-2 needs twice the H.264 rate; MPL: the
+  // bitrate goes as 1 / qscale, qscale 4 standing for the default.
+  EXPECT_EQ(GetDefaultVideoBitrate("h264", 1920, 1080, 30, 29), 4'000'000);
+  EXPECT_EQ(GetDefaultVideoBitrate("mpeg2video", 1920, 1080, 30, 4), 16'000'000);
+  EXPECT_EQ(GetDefaultVideoBitrate("mpeg2video", 1920, 1080, 30, 8), 8'000'000);
+  // Level ceilings: H.264 level 4 (1080p30) 20 Mbps x 1.25 for High; MPEG-2 Main@ML 15 Mbps.
+  EXPECT_EQ(GetMaxVideoBitrate("h264", 1920, 1080, 30, 0), 25'000'000);
+  EXPECT_EQ(GetMaxVideoBitrate("mpeg2video", 720, 576, 25, 1), 15'000'000);
+  // PRORES targets; DNXHR 3641344 bytes a UHD HQ frame at 25 fps.
+  EXPECT_EQ(GetDefaultVideoBitrate("prores_hq", 1920, 1080, 29.97, -1), 220'000'000);
+  EXPECT_EQ(GetDefaultVideoBitrate("prores_proxy", 3840, 2160, 29.97, -1), 182'000'000);
+  EXPECT_EQ(GetMaxVideoBitrate("prores_hq", 1920, 1080, 29.97, -1), 220'000'000);
+  EXPECT_EQ(GetDefaultVideoBitrate("dnxhr_hq", 3840, 2160, 25, 18), 728'268'800);
+  EXPECT_EQ(GetMaxVideoBitrate("dnxhd", 1920, 1080, 25, -1), 917504LL * 8 * 25);  // CID 1238
+  EXPECT_EQ(GetDefaultVideoBitrate("H264", 1920, 1080, 30, -1), 8'000'000);       // any case
+}
+
+TEST(BitratePresetsTest, QualityMovesTheSoftwareCodecsOnly) {
+  for (const std::string& id : GetPresetVideoCodecs()) {
+    const std::int64_t fine = GetDefaultVideoBitrate(id, 1280, 720, 30, 10);
+    const std::int64_t coarse = GetDefaultVideoBitrate(id, 1280, 720, 30, 40);
+    const bool fixedRate = id.rfind("prores", 0) == 0 || id.rfind("dnx", 0) == 0;
+    if (fixedRate) {
+      EXPECT_EQ(fine, coarse) << id;
+    } else {
+      EXPECT_GT(fine, coarse) << id;
+    }
+  }
+}
+
+TEST(BitratePresetsTest, AudioSpotValuesMatchThePublishedFigures) {
+  const auto stereo = CH_LAYOUT_STEREO;
+  EXPECT_EQ(GetDefaultAudioBitrate("pcm_s16le", 48000, stereo, AV_SAMPLE_FMT_S16), 1'536'000);
+  EXPECT_EQ(GetMinAudioBitrate("pcm_s16le", 44100, stereo, AV_SAMPLE_FMT_S16), 1'411'200);  // CD
+  EXPECT_EQ(GetMaxAudioBitrate("pcm_s24le", 96000, CH_LAYOUT_5POINT1, AV_SAMPLE_FMT_S32),
+            96000 * 6 * 24);  // the identifier fixes 24 bits, whatever the sample format
+  EXPECT_EQ(GetDefaultAudioBitrate("pcm_mulaw", 8000, CH_LAYOUT_MONO, AV_SAMPLE_FMT_NONE),
+            64'000);                                                // G.711
+  EXPECT_EQ(Audio("aac", 48000, stereo).def, 128'000);              // FF-AAC: 64 kbps a channel
+  EXPECT_EQ(Audio("aac", 48000, stereo).max, 576'000);              // 6144 bits / 1024 samples
+  EXPECT_LE(Audio("aac", 44100, stereo).max, 6 * 44100 * 2);        // never above that ceiling
+  EXPECT_EQ(Audio("opus", 48000, stereo).def, 96'000);              // FF-OPUS: one coupled stream
+  EXPECT_EQ(Audio("opus", 48000, CH_LAYOUT_5POINT1).def, 320'000);  // 4 streams, 2 coupled
+  EXPECT_EQ(Audio("ac3", 48000, CH_LAYOUT_5POINT1).def, 448'000);   // FF-TGT DVD
+  EXPECT_EQ(Audio("ac3", 48000, CH_LAYOUT_5POINT1_BACK).def, 448'000);
+  EXPECT_EQ(Audio("mp3", 44100, stereo).max, 320'000);     // MPA MPEG-1 table
+  EXPECT_EQ(Audio("mp3", 22050, stereo).max, 160'000);     // MPA MPEG-2 LSF table
+  EXPECT_EQ(Audio("flac", 44100, stereo).max, 1'411'200);  // incompressible: the PCM rate
+  EXPECT_GT(Audio("flac", 44100, stereo, AV_SAMPLE_FMT_S32).def,
+            Audio("flac", 44100, stereo, AV_SAMPLE_FMT_S16).def);
+}
+
+TEST(BitratePresetsTest, UnknownCodecsAreNamedInTheError) {
+  const std::string video =
+      DescriptionOf<UnknownCodecError>([] { GetDefaultVideoBitrate("h266", 640, 360, 30, -1); });
+  EXPECT_NE(video.find("h266"), std::string::npos) << video;
+  const std::string crossed =
+      DescriptionOf<UnknownCodecError>([] { GetMaxVideoBitrate("opus", 640, 360, 30, -1); });
+  EXPECT_NE(crossed.find("opus"), std::string::npos) << crossed;
+  const std::string audio = DescriptionOf<UnknownCodecError>(
+      [] { GetMinAudioBitrate("h264", 48000, CH_LAYOUT_STEREO, AV_SAMPLE_FMT_S16); });
+  EXPECT_NE(audio.find("h264"), std::string::npos) << audio;
+  EXPECT_TRUE(CatchAs<ConfException>([] { GetDefaultVideoBitrate("nope", 640, 360, 30, -1); }));
+}
+
+TEST(BitratePresetsTest, BadArgumentsAreNamedInTheError) {
+  const double nan = std::numeric_limits<double>::quiet_NaN();
+  const double inf = std::numeric_limits<double>::infinity();
+  const auto videoError = [](long long w, long long h, double fps) {
+    return DescriptionOf<InvalidPresetArgumentError>(
+        [=] { GetDefaultVideoBitrate("h264", w, h, fps, -1); });
+  };
+  const auto audioError = [](const char* id, long long rate, unsigned mask, AVSampleFormat f) {
+    return DescriptionOf<InvalidPresetArgumentError>(
+        [=] { GetDefaultAudioBitrate(id, rate, static_cast<ChannelLayout>(mask), f); });
+  };
+  EXPECT_NE(videoError(0, 1080, 30).find("Width 0"), std::string::npos);
+  EXPECT_NE(videoError(1920, -1, 30).find("Height -1"), std::string::npos);
+  EXPECT_NE(videoError(1920, 1080, -25).find("Frame rate -25"), std::string::npos);
+  EXPECT_NE(videoError(1920, 1080, nan).find("Frame rate nan"), std::string::npos);
+  EXPECT_NE(videoError(1920, 1080, inf).find("Frame rate inf"), std::string::npos);
+  EXPECT_NE(audioError("aac", 0, 3, AV_SAMPLE_FMT_S16).find("Sample rate 0"), std::string::npos);
+  EXPECT_NE(audioError("pcm_s16le", 4294967296LL, 3, AV_SAMPLE_FMT_S16).find("4294967296"),
+            std::string::npos);
+  EXPECT_NE(audioError("aac", 48000, 0, AV_SAMPLE_FMT_S16).find("Channel layout 0x0"),
+            std::string::npos);
+  EXPECT_NE(audioError("mp3", 48000, 0x60F, AV_SAMPLE_FMT_S16).find("mp3"), std::string::npos);
+  EXPECT_NE(audioError("flac", 48000, 3, AV_SAMPLE_FMT_NONE).find("Sample format -1"),
+            std::string::npos);
+  EXPECT_NE(audioError("alac", 48000, 3, AV_SAMPLE_FMT_FLT).find("flt"), std::string::npos);
+  // Every one of them is also a ConfException.
+  EXPECT_TRUE(CatchAs<ConfException>([] { GetMinVideoBitrate("h264", 0, 0, 30, -1); }));
+}
+
+}  // namespace
