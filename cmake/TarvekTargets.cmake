@@ -1,5 +1,12 @@
 # Helpers that give every Tarvek target the same compiler settings.
 
+# What a binary's run-time search path calls its own folder.
+if(APPLE)
+  set(TARVEK_ORIGIN "@loader_path")
+else()
+  set(TARVEK_ORIGIN "$ORIGIN")
+endif()
+
 # The warning list of our own targets; never pushed onto consumers.
 function(tarvek_set_warnings target)
   target_compile_options(${target} PRIVATE -Wall -Wextra -Wpedantic -Wconversion
@@ -32,5 +39,7 @@ function(tarvek_add_library target export_name output_name export_macro)
     DEFINE_SYMBOL ${export_macro}
     VERSION ${PROJECT_VERSION}
     SOVERSION ${PROJECT_VERSION_MAJOR}
-    INSTALL_NAME_DIR "@rpath")
+    INSTALL_NAME_DIR "@rpath"
+    # Installed libraries find their sibling libraries wherever the prefix is.
+    INSTALL_RPATH "${TARVEK_ORIGIN}")
 endfunction()

@@ -1,2 +1,362 @@
-// formatdesc: being written.
-int main() { return 0; }
+// formatdesc: builds a format description from command-line options and shows it, with the
+// bitrates the presets give for it. This file wires the subcommands and their options and turns
+// every failure into one line on standard error and an exit status:
+//   0 success, 1 the library refused (for example a setting the bitrates need is missing),
+//   2 bad usage (an unknown option, a value that cannot be read).
+#include <Tarvek/Formats.h>
+#include <CLI/CLI.hpp>
+
+#include <algorithm>
+#include <boost/exception/get_error_info.hpp>
+#include <cstdint>
+#include <iostream>
+#include <limits>
+#include <new>
+
+#include "Describe.h"
+#include "Options.h"
+#include "Output.h"
+
+namespace {
+
+using namespace Formatdesc;
+
+constexpr int kLibraryError = 1;
+constexpr int kUsageError = 2;
+constexpr const char* kExitStatus =
+    "Exit status: 0 on success, 1 when the library refuses the description, 2 for bad usage.";
+
+// Options every description subcommand has besides its settings.
+struct ShowFlags {
+  bool json = false;
+  bool noBitrate = false;
+};
+
+struct LadderArgs {
+  std::string codecId;
+  std::string frameRate = "30";
+  std::optional<std::string> quality;
+  bool json = false;
+};
+
+struct CodecsArgs {
+  std::optional<std::string> kind;
+  bool json = false;
+};
+
+// A text option that may be left out.
+CLI::Option* AddText(CLI::App& app, const std::string& name, std::optional<std::string>& value,
+                     const std::string& help, const std::string& type = "TEXT") {
+  return app.add_option(name, value, help)->type_name(type);
+}
+
+// --NAME sets a bool setting, --no-NAME (left out of the help, which mentions it) clears it;
+// with neither, the setting is left out. Each acts as it is parsed, so the last one given wins.
+void AddSwitch(CLI::App& app, const std::string& name, std::optional<bool>& value,
+               const std::string& help) {
+  CLI::Option* set = app.add_flag_callback(
+      "--" + name, [&value] { value = true; }, help);
+  CLI::Option* clear = app.add_flag_callback("--no-" + name, [&value] { value = false; });
+  set->disable_flag_override()->trigger_on_parse()->group("Codec settings");
+  clear->disable_flag_override()->trigger_on_parse()->group("");
+}
+
+void AddCodecOptions(CLI::App& app, CodecArgs& args, const std::string& idHelp) {
+  const std::string group = "Codec settings";
+  AddText(app, "--codec-id", args.codecId, idHelp, "ID")->group(group);
+  AddText(app, "--codec-name", args.codecName, "Codec name (free text)")->group(group);
+  AddText(app, "--tag", args.tag, "Codec tag: four characters (avc1) or a number", "FOURCC")
+      ->group(group);
+  AddText(app, "--bitrate-mode", args.bitrateMode,
+          "Bitrate mode: vbr (quality-driven), or any other text such as cbr", "MODE")
+      ->group(group);
+  AddText(app, "--bitrate", args.bitrate, "Bitrate in b/s: 4500000, 4500k or 4.5M", "RATE")
+      ->group(group);
+  AddText(app, "--quality", args.quality, "Encoder quality figure for vbr (CRF, qscale)", "N")
+      ->group(group);
+  AddText(app, "--threads", args.threads, "Encoder thread count (0: the encoder chooses)", "N")
+      ->group(group);
+  AddSwitch(app, "lossless", args.lossless, "Lossless encoding (--no-lossless: false)");
+  AddSwitch(app, "two-pass", args.twoPass, "Two-pass encoding (--no-two-pass: false)");
+  AddSwitch(app, "global-header", args.globalHeader, "Global header (--no-global-header: false)");
+  AddSwitch(app, "main-stream", args.mainStream, "Main stream (--no-main-stream: false)");
+  app.add_option("--encode-option", args.encodeOptions, "Encoder option, repeatable")
+      ->type_name("KEY=VALUE")
+      ->group(group);
+  app.add_option("--analyze-option", args.analyzeOptions, "Analyser option, repeatable")
+      ->type_name("KEY=VALUE")
+      ->group(group);
+}
+
+void AddShowFlags(CLI::App& app, ShowFlags& flags, bool bitrates) {
+  app.add_flag("--json", flags.json, "Print one JSON object instead of text");
+  if (bitrates) {
+    app.add_flag("--no-bitrate", flags.noBitrate, "Show the description without its bitrates");
+  }
+}
+
+std::string LayoutNamesText() {
+  std::string text;
+  for (const auto& entry : ChannelLayoutNames()) text += (text.empty() ? "" : ", ") + entry.first;
+  return text;
+}
+
+void AddVideo(CLI::App& app, VideoArgs& args, ShowFlags& flags) {
+  CLI::App* video = app.add_subcommand("video", "Describe a video stream");
+  AddCodecOptions(*video, args.codec, "Codec identifier known to the presets (h264, hevc, ...)");
+  const std::string group = "Video settings";
+  CLI::Option* size = AddText(*video, "--size", args.size, "Frame size", "WxH")->group(group);
+  CLI::Option* frameAspect =
+      AddText(*video, "--frame-aspect", args.frameAspect, "Display aspect (needs --size)", "W:H")
+          ->group(group);
+  AddText(*video, "--pixel-aspect", args.pixelAspect, "Pixel aspect (needs --size; default 1:1)",
+          "W:H")
+      ->group(group)
+      ->needs(size)
+      ->excludes(frameAspect);
+  frameAspect->needs(size);
+  AddText(*video, "--frame-rate", args.frameRate, "Frame rate: 30000/1001, 25 or 29.97", "RATE")
+      ->group(group);
+  AddText(*video, "--pix-fmt", args.pixelFormat, "Pixel format by name (yuv420p)", "NAME")
+      ->group(group);
+  AddShowFlags(*video, flags, true);
+  video->footer(
+      "The bitrates need --codec-id, --size, --frame-rate and --bitrate-mode, and --quality in\n"
+      "vbr mode; when one is missing, formatdesc names it and exits with status 1. --no-bitrate\n"
+      "shows the description without them.\n" +
+      std::string(kExitStatus));
+}
+
+void AddAudio(CLI::App& app, AudioArgs& args, ShowFlags& flags) {
+  CLI::App* audio = app.add_subcommand("audio", "Describe an audio stream");
+  AddCodecOptions(*audio, args.codec, "Codec identifier known to the presets (aac, opus, ...)");
+  const std::string group = "Audio settings";
+  AddText(*audio, "--sample-rate", args.sampleRate, "Sample rate in Hz", "HZ")->group(group);
+  AddText(*audio, "--layout", args.layout,
+          "Channel layout: " + LayoutNamesText() + ", or a speaker mask (0x3f)", "LAYOUT")
+      ->group(group);
+  AddText(*audio, "--frame-size", args.frameSize, "Samples per channel in a frame", "N")
+      ->group(group);
+  AddText(*audio, "--sample-fmt", args.sampleFormat, "Sample format by name (fltp, s16)", "NAME")
+      ->group(group);
+  AddText(*audio, "--language", args.language, "Language code (eng)", "LANG")->group(group);
+  AddShowFlags(*audio, flags, true);
+  audio->footer(
+      "The bitrates need --codec-id, --sample-rate, --layout and --sample-fmt; when one is\n"
+      "missing, formatdesc names it and exits with status 1. --no-bitrate shows the description\n"
+      "without them.\n" +
+      std::string(kExitStatus));
+}
+
+void AddSubtitle(CLI::App& app, SubtitleArgs& args, ShowFlags& flags) {
+  CLI::App* subtitle = app.add_subcommand("subtitle", "Describe a subtitle stream");
+  AddCodecOptions(*subtitle, args.codec, "Codec identifier (any: ass, dvb_subtitle, ...)");
+  const std::string group = "Subtitle settings";
+  AddText(*subtitle, "--language", args.language, "Language code (eng)", "LANG")->group(group);
+  AddText(*subtitle, "--title", args.title, "Title")->group(group);
+  AddText(*subtitle, "--author", args.author, "Author")->group(group);
+  AddText(*subtitle, "--header", args.header, "The codec's header text (styles)")->group(group);
+  AddText(*subtitle, "--dvb-size", args.dvbSize, "DVB display size", "WxH")->group(group);
+  AddShowFlags(*subtitle, flags, false);
+  subtitle->footer("Any codec identifier is taken: the presets have no subtitle codecs.\n" +
+                   std::string(kExitStatus));
+}
+
+void AddLadder(CLI::App& app, LadderArgs& args) {
+  CLI::App* ladder =
+      app.add_subcommand("ladder", "Default, minimum and maximum bitrates from 240p to 2160p");
+  ladder->add_option("codec-id", args.codecId, "Video codec identifier known to the presets")
+      ->required()
+      ->type_name("ID");
+  ladder->add_option("--frame-rate", args.frameRate, "Frame rate: 30000/1001, 25 or 29.97")
+      ->type_name("RATE")
+      ->capture_default_str();
+  AddText(*ladder, "--quality", args.quality, "Encoder quality figure (vbr mode)", "N");
+  ladder->add_flag("--json", args.json, "Print one JSON object instead of the table");
+  ladder->footer(
+      "Each size has square pixels; with --quality the bitrates are those of vbr mode at that\n"
+      "quality.\n" +
+      std::string(kExitStatus));
+}
+
+void AddCodecs(CLI::App& app, CodecsArgs& args) {
+  CLI::App* codecs = app.add_subcommand("codecs", "The codec identifiers the presets know");
+  AddText(*codecs, "--kind", args.kind, "Only this kind, one identifier a line", "video|audio");
+  codecs->add_flag("--json", args.json, "Print one JSON object instead of text");
+  codecs->footer(kExitStatus);
+}
+
+void Show(Tarvek::Conf::IFormatCodec& codec, const std::optional<Bitrates>& bitrates, bool json) {
+  if (json) {
+    PrintJson(std::cout, DescriptionJson(codec, bitrates));
+  } else {
+    PrintDescription(codec, bitrates);
+  }
+}
+
+void RunVideo(const VideoArgs& args, const ShowFlags& flags) {
+  const auto video = BuildVideo(args);
+  std::optional<Bitrates> bitrates;
+  if (!flags.noBitrate) bitrates = VideoBitrates(video);
+  Show(*video, bitrates, flags.json);
+}
+
+void RunAudio(const AudioArgs& args, const ShowFlags& flags) {
+  const auto audio = BuildAudio(args);
+  std::optional<Bitrates> bitrates;
+  if (!flags.noBitrate) bitrates = AudioBitrates(audio);
+  Show(*audio, bitrates, flags.json);
+}
+
+void RunLadder(const LadderArgs& args) {
+  const std::string codecId =
+      CheckCodecId("codec-id", args.codecId, Tarvek::Conf::GetPresetVideoCodecs(), "video");
+  const Pair rate = ParseFrameRate("--frame-rate", args.frameRate);
+  std::optional<long long> quality;
+  if (args.quality) {
+    quality = ParseNonNegative("--quality", *args.quality, std::numeric_limits<int>::max());
+  }
+  const auto rows = BuildLadder(codecId, rate, quality);
+  if (args.json) {
+    PrintJson(std::cout, LadderJson(codecId, rate, quality, rows));
+  } else {
+    PrintLadder(std::cout, codecId, rate, quality, rows);
+  }
+}
+
+void RunCodecs(const CodecsArgs& args) {
+  if (args.kind && *args.kind != "video" && *args.kind != "audio") {
+    throw BadValue("--kind", "video or audio", *args.kind);
+  }
+  if (args.json) {
+    PrintJson(std::cout, CodecsJson(args.kind));
+  } else {
+    PrintCodecs(std::cout, args.kind);
+  }
+}
+
+// The library's own description of its error, and for a setting the bitrates need, the option
+// that gives it.
+std::string LibraryMessage(const Tarvek::Exception& e) {
+  const std::string* description = boost::get_error_info<Tarvek::DescriptionInfo>(e);
+  std::string message = description != nullptr ? *description : "the library gave no description";
+  const std::string* child = boost::get_error_info<Tarvek::Core::ChildNotFound::ChildNameInfo>(e);
+  if (child != nullptr && !OptionForSetting(*child).empty()) {
+    message += " (needed for the bitrates: give " + OptionForSetting(*child) +
+               ", or --no-bitrate to leave them out)";
+  }
+  return message;
+}
+
+int Fail(const std::string& message, int status) {
+  std::cout.flush();
+  std::cerr << "formatdesc: " << message << '\n';
+  return status;
+}
+
+// The switch given a value ("--lossless=1"), named as typed: CLI11's own message names it
+// without dashes, and not at all for a --no- form.
+std::string SwitchValueMessage(int argc, char** argv) {
+  static const char* const kSwitches[] = {"lossless", "two-pass", "global-header", "main-stream"};
+  for (int i = 1; i < argc; ++i) {
+    const std::string argument = argv[i];
+    const std::string name = argument.substr(0, argument.find('='));
+    for (const char* const known : kSwitches) {
+      if (name == std::string("--") + known || name == std::string("--no-") + known) {
+        return name + ": expected no value (a switch), got '" + argument + "'";
+      }
+    }
+  }
+  return "a switch was given a value";
+}
+
+// The first argument nothing took, an option before any other: CLI11 lists them all, options
+// last.
+std::string ExtrasMessage(const CLI::App& app) {
+  std::string help = "formatdesc";
+  if (!app.get_subcommands().empty()) help += ' ' + app.get_subcommands().front()->get_name();
+  const std::vector<std::string> extras = app.remaining(true);
+  if (extras.empty()) return "unexpected arguments (see " + help + " --help)";
+  const auto option = std::find_if(extras.begin(), extras.end(), [](const std::string& extra) {
+    return extra.rfind('-', 0) == 0;
+  });
+  const std::string shown = option != extras.end() ? "unknown option '" + *option + "'"
+                                                   : "unexpected argument '" + extras.front() + "'";
+  return shown + " (see " + help + " --help)";
+}
+
+// CLI11's message, except where it does not name what was wrong as the command line has it: a
+// switch given a value, an unknown or missing subcommand.
+std::string ParseErrorMessage(const CLI::App& app, const CLI::ParseError& e, int argc,
+                              char** argv) {
+  const std::string known = "video, audio, subtitle, ladder or codecs";
+  if (std::string(e.what()).find("disallowed flag override") != std::string::npos) {
+    return SwitchValueMessage(argc, argv);
+  }
+  if (dynamic_cast<const CLI::ExtrasError*>(&e) != nullptr) return ExtrasMessage(app);
+  if (!app.get_subcommands().empty() || dynamic_cast<const CLI::RequiredError*>(&e) == nullptr) {
+    return e.what();
+  }
+  if (argc > 1 && argv[1][0] == '-') {
+    return "unknown option '" + std::string(argv[1]) + "' (see formatdesc --help)";
+  }
+  if (argc > 1) return "unknown subcommand '" + std::string(argv[1]) + "' (expected " + known + ")";
+  return "a subcommand is required: " + known + " (see formatdesc --help)";
+}
+
+int Run(int argc, char** argv) {
+  CLI::App app("Builds a media format description from options and shows it.", "formatdesc");
+  app.set_version_flag("--version", std::string("formatdesc ") + TARVEK_FORMATS_VERSION);
+  app.require_subcommand(1);
+  app.footer("Run 'formatdesc SUBCOMMAND --help' for the options of each.\n" +
+             std::string(kExitStatus));
+  VideoArgs video;
+  AudioArgs audio;
+  SubtitleArgs subtitle;
+  ShowFlags videoFlags, audioFlags, subtitleFlags;
+  LadderArgs ladder;
+  CodecsArgs codecs;
+  AddVideo(app, video, videoFlags);
+  AddAudio(app, audio, audioFlags);
+  AddSubtitle(app, subtitle, subtitleFlags);
+  AddLadder(app, ladder);
+  AddCodecs(app, codecs);
+  try {
+    app.parse(argc, argv);
+  } catch (const CLI::ParseError& e) {
+    if (e.get_exit_code() == 0) return app.exit(e);  // --help, --version
+    return Fail(ParseErrorMessage(app, e, argc, argv), kUsageError);
+  } catch (const std::exception& e) {
+    // A value CLI11 converts itself and gets wrong is bad usage too.
+    return Fail(e.what(), kUsageError);
+  }
+  const std::string name = app.get_subcommands().front()->get_name();
+  if (name == "video") RunVideo(video, videoFlags);
+  if (name == "audio") RunAudio(audio, audioFlags);
+  if (name == "subtitle") {
+    const auto description = BuildSubtitle(subtitle);
+    Show(*description, std::nullopt, subtitleFlags.json);
+  }
+  if (name == "ladder") RunLadder(ladder);
+  if (name == "codecs") RunCodecs(codecs);
+  if (!std::cout.flush()) return Fail("cannot write to standard output", kLibraryError);
+  return 0;
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+  try {
+    return Run(argc, argv);
+  } catch (const UsageError& e) {
+    return Fail(e.what(), kUsageError);
+  } catch (const Tarvek::Exception& e) {
+    return Fail(LibraryMessage(e), kLibraryError);
+  } catch (const std::bad_alloc&) {
+    return Fail("out of memory", kLibraryError);
+  } catch (const std::exception& e) {
+    return Fail(e.what(), kLibraryError);
+  } catch (...) {
+    return Fail("unexpected error", kLibraryError);
+  }
+}

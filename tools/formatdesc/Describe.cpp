@@ -1,0 +1,174 @@
+// formatdesc's descriptions, built only through the library's public interfaces.
+#include "Describe.h"
+
+#include <limits>
+#include <map>
+
+namespace Formatdesc {
+namespace {
+
+using Tarvek::Conf::IFormatCodec;
+using Tarvek::Conf::IFormatCodecAudio;
+using Tarvek::Conf::IFormatCodecSubtitle;
+using Tarvek::Conf::IFormatCodecVideo;
+
+constexpr long long kMaxInt = std::numeric_limits<int>::max();
+constexpr long long kMaxUnsigned = std::numeric_limits<unsigned int>::max();
+
+// An options sub-tree from KEY=VALUE texts, values kept as strings.
+Tarvek::Core::Property OptionsTree(const std::string& option,
+                                   const std::vector<std::string>& entries) {
+  Tarvek::Core::Property tree("options");
+  for (const std::string& entry : entries) {
+    const auto [key, value] = ParseKeyValue(option, entry);
+    tree.SetChildT<std::string>(key, value);
+  }
+  return tree;
+}
+
+// The settings every codec description shares, in the order of the options' help.
+void SetCodecSettings(IFormatCodec& codec, const CodecArgs& args) {
+  if (args.codecName) codec.SetCodecName(*args.codecName);
+  if (args.tag) codec.SetCodecTag(ParseCodecTag("--tag", *args.tag));
+  if (args.bitrateMode) codec.SetBitrateMode(*args.bitrateMode);
+  if (args.bitrate) codec.SetBitrate(ParseBitrate("--bitrate", *args.bitrate));
+  if (args.quality) codec.SetQuality(ParseNonNegative("--quality", *args.quality, kMaxInt));
+  if (args.threads) {
+    codec.SetThreadNumber(
+        static_cast<unsigned int>(ParseNonNegative("--threads", *args.threads, kMaxUnsigned)));
+  }
+  if (args.lossless) codec.SetLossless(*args.lossless);
+  if (args.twoPass) codec.SetTwoPassEncoding(*args.twoPass);
+  if (args.globalHeader) codec.SetGlobalHeader(*args.globalHeader);
+  if (args.mainStream) codec.SetMainStream(*args.mainStream);
+  if (!args.encodeOptions.empty()) {
+    codec.SetOptionsEncode(OptionsTree("--encode-option", args.encodeOptions));
+  }
+  if (!args.analyzeOptions.empty()) {
+    codec.SetOptionsAnalyze(OptionsTree("--analyze-option", args.analyzeOptions));
+  }
+}
+
+// Size and pixel aspect go in together, as the interface wants; square pixels unless told.
+void SetGeometry(IFormatCodecVideo& video, const VideoArgs& args) {
+  if (!args.size) return;
+  const Pair size = ParseSize("--size", *args.size);
+  if (args.frameAspect) {
+    const Pair aspect = ParseRatio("--frame-aspect", *args.frameAspect);
+    video.InitByFrameAspect(size.first, size.second, aspect.first, aspect.second);
+    return;
+  }
+  const Pair pixel =
+      args.pixelAspect ? ParseRatio("--pixel-aspect", *args.pixelAspect) : Pair{1, 1};
+  video.InitByPixelAspect(size.first, size.second, pixel.first, pixel.second);
+}
+
+}  // namespace
+
+boost::intrusive_ptr<IFormatCodecVideo> BuildVideo(const VideoArgs& args) {
+  auto video = Tarvek::Conf::FormatCodecVideo::Create();
+  if (args.codec.codecId) {
+    video->SetCodecID(CheckCodecId("--codec-id", *args.codec.codecId,
+                                   Tarvek::Conf::GetPresetVideoCodecs(), "video"));
+  }
+  SetCodecSettings(*video, args.codec);
+  SetGeometry(*video, args);
+  if (args.frameRate) {
+    const Pair rate = ParseFrameRate("--frame-rate", *args.frameRate);
+    video->SetFrameRate(rate.first, rate.second);
+  }
+  if (args.pixelFormat) video->SetPixelFormat(ParsePixelFormat("--pix-fmt", *args.pixelFormat));
+  return video;
+}
+
+boost::intrusive_ptr<IFormatCodecAudio> BuildAudio(const AudioArgs& args) {
+  auto audio = Tarvek::Conf::FormatCodecAudio::Create();
+  if (args.codec.codecId) {
+    audio->SetCodecID(CheckCodecId("--codec-id", *args.codec.codecId,
+                                   Tarvek::Conf::GetPresetAudioCodecs(), "audio"));
+  }
+  SetCodecSettings(*audio, args.codec);
+  if (args.sampleRate) {
+    audio->SetSampleRate(
+        static_cast<int>(ParsePositive("--sample-rate", *args.sampleRate, kMaxInt)));
+  }
+  if (args.layout) audio->SetChannelLayout(ParseChannelLayout("--layout", *args.layout));
+  if (args.frameSize) {
+    audio->SetFrameSize(static_cast<int>(ParsePositive("--frame-size", *args.frameSize, kMaxInt)));
+  }
+  if (args.sampleFormat) {
+    audio->SetSampleFormat(ParseSampleFormat("--sample-fmt", *args.sampleFormat));
+  }
+  if (args.language) audio->SetLanguage(*args.language);
+  return audio;
+}
+
+boost::intrusive_ptr<IFormatCodecSubtitle> BuildSubtitle(const SubtitleArgs& args) {
+  auto subtitle = Tarvek::Conf::FormatCodecSubtitle::Create();
+  // The presets know no subtitle codecs, so any identifier is taken.
+  if (args.codec.codecId) subtitle->SetCodecID(*args.codec.codecId);
+  SetCodecSettings(*subtitle, args.codec);
+  if (args.language) subtitle->SetLanguage(*args.language);
+  if (args.title) subtitle->SetTitle(*args.title);
+  if (args.author) subtitle->SetAuthor(*args.author);
+  if (args.header) subtitle->SetSubtitleHeader(*args.header);
+  if (args.dvbSize) {
+    const Pair size = ParseSize("--dvb-size", *args.dvbSize);
+    subtitle->SetDVBWidth(size.first);
+    subtitle->SetDVBHeight(size.second);
+  }
+  return subtitle;
+}
+
+Bitrates VideoBitrates(const boost::intrusive_ptr<const IFormatCodec>& video) {
+  // Braces evaluate left to right: the default is asked first and reports a missing setting.
+  return Bitrates{Tarvek::Conf::GetDefaultVideoBitrate(video),
+                  Tarvek::Conf::GetMinVideoBitrate(video), Tarvek::Conf::GetMaxVideoBitrate(video)};
+}
+
+Bitrates AudioBitrates(const boost::intrusive_ptr<const IFormatCodec>& audio) {
+  return Bitrates{Tarvek::Conf::GetDefaultAudioBitrate(audio),
+                  Tarvek::Conf::GetMinAudioBitrate(audio), Tarvek::Conf::GetMaxAudioBitrate(audio)};
+}
+
+std::string OptionForSetting(const std::string& key) {
+  static const std::map<std::string, std::string> options = {
+      {IFormatCodec::TAG_CODEC_ID, "--codec-id"},
+      {IFormatCodec::TAG_BITRATE_MODE, "--bitrate-mode"},
+      {IFormatCodec::TAG_QUALITY, "--quality"},
+      {IFormatCodecVideo::TAG_WIDTH, "--size"},
+      {IFormatCodecVideo::TAG_HEIGHT, "--size"},
+      {IFormatCodecVideo::TAG_ASPECTX, "--size"},
+      {IFormatCodecVideo::TAG_ASPECTY, "--size"},
+      {IFormatCodecVideo::TAG_TIMEBASE_N, "--frame-rate"},
+      {IFormatCodecVideo::TAG_TIMEBASE_D, "--frame-rate"},
+      {IFormatCodecAudio::TAG_SAMPLE_RATE, "--sample-rate"},
+      {IFormatCodecAudio::TAG_LAYOUT, "--layout"},
+      {IFormatCodecAudio::TAG_SAMPLE_FORMAT, "--sample-fmt"},
+  };
+  const auto found = options.find(key);
+  return found == options.end() ? std::string() : found->second;
+}
+
+std::vector<LadderRow> BuildLadder(const std::string& codecId, Pair frameRate,
+                                   std::optional<long long> quality) {
+  static const std::vector<std::pair<std::string, Pair>> kSizes = {
+      {"240p", {426, 240}},    {"360p", {640, 360}},    {"480p", {854, 480}},
+      {"720p", {1280, 720}},   {"1080p", {1920, 1080}}, {"1440p", {2560, 1440}},
+      {"2160p", {3840, 2160}},
+  };
+  std::vector<LadderRow> rows;
+  for (const auto& [name, size] : kSizes) {
+    auto video = Tarvek::Conf::FormatCodecVideo::Create();
+    video->SetCodecID(codecId);
+    video->InitByPixelAspect(size.first, size.second, 1, 1);
+    video->SetFrameRate(frameRate.first, frameRate.second);
+    // Without a quality, a target-bitrate mode: the bitrate functions then leave quality out.
+    video->SetBitrateMode(quality ? IFormatCodec::TAG_BITRATE_MODE_VBR : std::string("cbr"));
+    if (quality) video->SetQuality(*quality);
+    rows.push_back(LadderRow{name, size, VideoBitrates(video)});
+  }
+  return rows;
+}
+
+}  // namespace Formatdesc

@@ -1,0 +1,293 @@
+// formatdesc's output. Text goes to standard output because PrintContent writes there.
+#include "Output.h"
+
+#include <bitset>
+#include <cstdio>
+#include <iomanip>
+#include <iostream>
+
+extern "C" {
+#include <libavutil/pixdesc.h>
+#include <libavutil/samplefmt.h>
+}
+
+namespace Formatdesc {
+namespace {
+
+using Tarvek::Conf::IFormatCodec;
+using Tarvek::Conf::IFormatCodecAudio;
+using Tarvek::Conf::IFormatCodecVideo;
+
+// The values a reader cannot see at a glance in the property tree, when their settings are set.
+struct Derived {
+  std::optional<Pair> frameAspect;
+  std::optional<Pair> frameRate;
+  std::optional<std::string> pixelFormat;
+  std::optional<std::string> layout;
+  std::optional<std::size_t> channels;
+  std::optional<std::string> sampleFormat;
+};
+
+std::string RatioText(Pair ratio, char separator) {
+  return std::to_string(ratio.first) + separator + std::to_string(ratio.second);
+}
+
+std::string LayoutName(Tarvek::Conf::ChannelLayout layout) {
+  for (const auto& [name, value] : ChannelLayoutNames()) {
+    if (value == layout) return name;
+  }
+  char hex[16];
+  std::snprintf(hex, sizeof hex, "0x%x", static_cast<unsigned int>(layout));
+  return hex;
+}
+
+// libavutil's name of a format, or its number when libavutil has none.
+std::string FormatName(const char* name, long long number) {
+  return name != nullptr ? std::string(name) : std::to_string(number);
+}
+
+void DeriveVideo(const IFormatCodecVideo& video, Derived& derived) {
+  if (video.ExistsWidth() && video.ExistsHeight() && video.ExistsPixelAspectX() &&
+      video.ExistsPixelAspectY()) {
+    derived.frameAspect = Pair{video.GetFrameAspectX(), video.GetFrameAspectY()};
+  }
+  if (video.ExistsFrameRateNum() && video.ExistsFrameRateDen()) {
+    derived.frameRate = Pair{video.GetFrameRateNum(), video.GetFrameRateDen()};
+  }
+  if (video.ExistsPixelFormat()) {
+    const AVPixelFormat format = video.GetPixelFormat();
+    derived.pixelFormat = FormatName(av_get_pix_fmt_name(format), format);
+  }
+}
+
+void DeriveAudio(const IFormatCodecAudio& audio, Derived& derived) {
+  if (audio.ExistsChannelLayout()) {
+    derived.layout = LayoutName(audio.GetChannelLayout());
+    derived.channels = std::bitset<32>(audio.GetChannelLayout()).count();
+  }
+  if (audio.ExistsSampleFormat()) {
+    const AVSampleFormat format = audio.GetSampleFormat();
+    derived.sampleFormat = FormatName(av_get_sample_fmt_name(format), format);
+  }
+}
+
+Derived Derive(const IFormatCodec& codec) {
+  Derived derived;
+  if (const auto* video = dynamic_cast<const IFormatCodecVideo*>(&codec)) {
+    DeriveVideo(*video, derived);
+  }
+  if (const auto* audio = dynamic_cast<const IFormatCodecAudio*>(&codec)) {
+    DeriveAudio(*audio, derived);
+  }
+  return derived;
+}
+
+std::vector<std::pair<std::string, std::string>> SummaryLines(
+    const Derived& derived, const std::optional<Bitrates>& bitrates) {
+  std::vector<std::pair<std::string, std::string>> lines;
+  if (derived.frameAspect) lines.emplace_back("Frame aspect", RatioText(*derived.frameAspect, ':'));
+  if (derived.frameRate) {
+    const Pair rate = *derived.frameRate;
+    const double fps = rate.second == 0 ? 0.0 : double(rate.first) / double(rate.second);
+    lines.emplace_back("Frame rate",
+                       ReadableFrameRate(fps) + " fps (" + RatioText(rate, '/') + ")");
+  }
+  if (derived.pixelFormat) lines.emplace_back("Pixel format", *derived.pixelFormat);
+  if (derived.layout) {
+    const std::size_t count = *derived.channels;
+    lines.emplace_back("Channel layout", *derived.layout + " (" + std::to_string(count) +
+                                             (count == 1 ? " channel)" : " channels)"));
+  }
+  if (derived.sampleFormat) lines.emplace_back("Sample format", *derived.sampleFormat);
+  if (bitrates) {
+    lines.emplace_back("Default bitrate", DescribeBitrate(bitrates->typical));
+    lines.emplace_back("Minimum bitrate", DescribeBitrate(bitrates->minimum));
+    lines.emplace_back("Maximum bitrate", DescribeBitrate(bitrates->maximum));
+  }
+  return lines;
+}
+
+std::string KindName(int codecType) {
+  switch (codecType) {
+    case 0:
+      return "video";
+    case 1:
+      return "audio";
+    case 3:
+      return "subtitle";
+    default:
+      return "codec";
+  }
+}
+
+// A property tree as JSON: containers as objects (the first child of a repeated name wins, as in
+// the library's look-ups), leaves as their values.
+nlohmann::ordered_json TreeJson(const Tarvek::Core::Property& node) {
+  switch (node.GetType()) {
+    case Tarvek::PropertyTypeBool:
+      return node.GetBool();
+    case Tarvek::PropertyTypeInt64:
+      return node.GetInt64();
+    case Tarvek::PropertyTypeString:
+      return node.GetString();
+    default:
+      break;
+  }
+  nlohmann::ordered_json object = nlohmann::ordered_json::object();
+  for (const Tarvek::Core::Property& child : node.GetChildren()) {
+    if (!object.contains(child.GetName())) object[child.GetName()] = TreeJson(child);
+  }
+  return object;
+}
+
+nlohmann::ordered_json BitratesJson(const Bitrates& bitrates) {
+  return {{"default", bitrates.typical}, {"min", bitrates.minimum}, {"max", bitrates.maximum}};
+}
+
+// Table cells joined by two spaces, each padded to its column's width: left-aligned columns
+// before `firstRight`, right-aligned from it on.
+void PrintTable(std::ostream& out, const std::vector<std::vector<std::string>>& rows,
+                std::size_t firstRight) {
+  std::vector<std::size_t> widths(rows.front().size(), 0);
+  for (const auto& row : rows) {
+    for (std::size_t i = 0; i < row.size(); ++i) widths[i] = std::max(widths[i], row[i].size());
+  }
+  for (const auto& row : rows) {
+    std::string line;
+    for (std::size_t i = 0; i < row.size(); ++i) {
+      const std::string padding(widths[i] - row[i].size(), ' ');
+      if (i > 0) line += "  ";
+      line += i < firstRight ? row[i] + padding : padding + row[i];
+    }
+    out << line.substr(0, line.find_last_not_of(' ') + 1) << '\n';
+  }
+}
+
+// `ids` after a two-space indent, wrapped before 80 columns.
+void PrintWrapped(std::ostream& out, const std::vector<std::string>& ids) {
+  std::string line = " ";
+  for (const std::string& id : ids) {
+    if (line.size() + 1 + id.size() > 80 && line.size() > 1) {
+      out << line << '\n';
+      line = " ";
+    }
+    line += ' ' + id;
+  }
+  out << line << '\n';
+}
+
+}  // namespace
+
+std::string ReadableBitrate(long long bitsPerSecond) {
+  const bool negative = bitsPerSecond < 0;
+  const unsigned long long magnitude = negative
+                                           ? 0ull - static_cast<unsigned long long>(bitsPerSecond)
+                                           : static_cast<unsigned long long>(bitsPerSecond);
+  // Hundredths of the unit, rounded; a figure that rounds to 1000.00 kb/s moves up to Mb/s.
+  unsigned long long hundredths = magnitude / 10 + (magnitude % 10 >= 5 ? 1 : 0);
+  const char* unit = "kb/s";
+  if (hundredths >= 100000) {
+    hundredths = magnitude / 10000 + (magnitude % 10000 >= 5000 ? 1 : 0);
+    unit = "Mb/s";
+  }
+  char text[64];
+  std::snprintf(text, sizeof text, "%s%llu.%02llu %s", negative ? "-" : "", hundredths / 100,
+                hundredths % 100, unit);
+  return text;
+}
+
+std::string DescribeBitrate(long long bitsPerSecond) {
+  return ReadableBitrate(bitsPerSecond) + " (" + std::to_string(bitsPerSecond) + " b/s)";
+}
+
+std::string ReadableFrameRate(double framesPerSecond) {
+  char text[64];
+  std::snprintf(text, sizeof text, "%.3f", framesPerSecond);
+  std::string result = text;
+  result.erase(result.find_last_not_of('0') + 1);
+  if (result.back() == '.') result.pop_back();
+  return result;
+}
+
+void PrintDescription(IFormatCodec& codec, const std::optional<Bitrates>& bitrates) {
+  codec.PrintContent();
+  const auto lines = SummaryLines(Derive(codec), bitrates);
+  if (lines.empty()) return;
+  std::cout << "======Summary:=============\n";
+  for (const auto& [label, value] : lines) {
+    std::cout << std::left << std::setw(17) << label + ":" << value << '\n';
+  }
+}
+
+nlohmann::ordered_json DescriptionJson(const IFormatCodec& codec,
+                                       const std::optional<Bitrates>& bitrates) {
+  nlohmann::ordered_json json = {{"kind", KindName(codec.GetCodecType())},
+                                 {"settings", TreeJson(codec.GetProperty())}};
+  const Derived derived = Derive(codec);
+  if (derived.frameAspect) json["frame_aspect"] = RatioText(*derived.frameAspect, ':');
+  if (derived.frameRate) {
+    const Pair rate = *derived.frameRate;
+    json["frame_rate"] = rate.second == 0 ? 0.0 : double(rate.first) / double(rate.second);
+  }
+  if (derived.pixelFormat) json["pix_fmt_name"] = *derived.pixelFormat;
+  if (derived.layout) json["channel_layout_name"] = *derived.layout;
+  if (derived.channels) json["channels"] = *derived.channels;
+  if (derived.sampleFormat) json["sample_fmt_name"] = *derived.sampleFormat;
+  if (bitrates) json["bitrate"] = BitratesJson(*bitrates);
+  return json;
+}
+
+void PrintLadder(std::ostream& out, const std::string& codecId, Pair frameRate,
+                 std::optional<long long> quality, const std::vector<LadderRow>& rows) {
+  out << codecId << " at " << ReadableFrameRate(double(frameRate.first) / frameRate.second)
+      << " fps" << (quality ? ", quality " + std::to_string(*quality) : std::string()) << '\n';
+  std::vector<std::vector<std::string>> table = {{"name", "size", "default", "minimum", "maximum"}};
+  for (const LadderRow& row : rows) {
+    table.push_back({row.name, RatioText(row.size, 'x'), ReadableBitrate(row.bitrates.typical),
+                     ReadableBitrate(row.bitrates.minimum), ReadableBitrate(row.bitrates.maximum)});
+  }
+  PrintTable(out, table, 2);
+}
+
+nlohmann::ordered_json LadderJson(const std::string& codecId, Pair frameRate,
+                                  std::optional<long long> quality,
+                                  const std::vector<LadderRow>& rows) {
+  nlohmann::ordered_json json = {
+      {"codec_id", codecId},
+      {"frame_rate", double(frameRate.first) / frameRate.second},
+      {"quality", quality ? nlohmann::ordered_json(*quality) : nlohmann::ordered_json()},
+      {"sizes", nlohmann::ordered_json::array()}};
+  for (const LadderRow& row : rows) {
+    json["sizes"].push_back({{"name", row.name},
+                             {"width", row.size.first},
+                             {"height", row.size.second},
+                             {"bitrate", BitratesJson(row.bitrates)}});
+  }
+  return json;
+}
+
+void PrintCodecs(std::ostream& out, const std::optional<std::string>& kind) {
+  if (kind) {
+    const auto& ids = *kind == "video" ? Tarvek::Conf::GetPresetVideoCodecs()
+                                       : Tarvek::Conf::GetPresetAudioCodecs();
+    for (const std::string& id : ids) out << id << '\n';
+    return;
+  }
+  out << "video:\n";
+  PrintWrapped(out, Tarvek::Conf::GetPresetVideoCodecs());
+  out << "audio:\n";
+  PrintWrapped(out, Tarvek::Conf::GetPresetAudioCodecs());
+}
+
+nlohmann::ordered_json CodecsJson(const std::optional<std::string>& kind) {
+  nlohmann::ordered_json json = nlohmann::ordered_json::object();
+  if (!kind || *kind == "video") json["video"] = Tarvek::Conf::GetPresetVideoCodecs();
+  if (!kind || *kind == "audio") json["audio"] = Tarvek::Conf::GetPresetAudioCodecs();
+  return json;
+}
+
+void PrintJson(std::ostream& out, const nlohmann::ordered_json& value) {
+  out << value.dump(2, ' ', false, nlohmann::ordered_json::error_handler_t::replace) << '\n';
+}
+
+}  // namespace Formatdesc

@@ -1,0 +1,52 @@
+// formatdesc's output: a description as text (its own PrintContent, then a summary of readable
+// values and bitrates) or as one JSON object, the bitrate ladder, and the preset codec lists.
+#ifndef TARVEK_TOOLS_FORMATDESC_OUTPUT_H_
+#define TARVEK_TOOLS_FORMATDESC_OUTPUT_H_
+
+#include <Tarvek/Formats.h>
+
+#include <iosfwd>
+#include <nlohmann/json.hpp>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "Describe.h"
+
+namespace Formatdesc {
+
+/// "4.50 Mb/s" from 1 Mb/s up, "128.00 kb/s" below, both rounded to two places.
+std::string ReadableBitrate(long long bitsPerSecond);
+/// "4.50 Mb/s (4500000 b/s)".
+std::string DescribeBitrate(long long bitsPerSecond);
+/// A frame rate with at most three decimal places and no trailing zeros: "29.97", "25".
+std::string ReadableFrameRate(double framesPerSecond);
+
+/// Prints `codec`'s PrintContent to standard output, then under "======Summary:=============" the
+/// derived values that are set (frame aspect and rate, format and layout names) and the
+/// bitrates when given, one "Label: value" line each.
+void PrintDescription(Tarvek::Conf::IFormatCodec& codec, const std::optional<Bitrates>& bitrates);
+
+/// The same as one JSON object: "kind", "settings" (the property tree under the description's
+/// own keys), the derived values, and "bitrate" {"default", "min", "max"} when given.
+nlohmann::ordered_json DescriptionJson(const Tarvek::Conf::IFormatCodec& codec,
+                                       const std::optional<Bitrates>& bitrates);
+
+/// The ladder as an aligned table under a title line naming codec, frame rate and quality.
+void PrintLadder(std::ostream& out, const std::string& codecId, Pair frameRate,
+                 std::optional<long long> quality, const std::vector<LadderRow>& rows);
+nlohmann::ordered_json LadderJson(const std::string& codecId, Pair frameRate,
+                                  std::optional<long long> quality,
+                                  const std::vector<LadderRow>& rows);
+
+/// The preset codec identifiers: by kind under a heading each, or one a line for `kind` alone
+/// ("video" or "audio"); as JSON, an array under each kind's name.
+void PrintCodecs(std::ostream& out, const std::optional<std::string>& kind);
+nlohmann::ordered_json CodecsJson(const std::optional<std::string>& kind);
+
+/// Writes `value` indented by two, with invalid UTF-8 in strings replaced rather than refused.
+void PrintJson(std::ostream& out, const nlohmann::ordered_json& value);
+
+}  // namespace Formatdesc
+
+#endif  // TARVEK_TOOLS_FORMATDESC_OUTPUT_H_
