@@ -1,10 +1,12 @@
 // Tarvek::Core::Property: construction, copying and assignment (aliasing included), look-up,
-// SetChild, typed getters, equality and PrintPropertyValue.
+// SetChild, the typed child helpers SetChildT / CreateChildT with their pinned refusals, typed
+// getters, equality and PrintPropertyValue.
+#include <functional>
 #include <iterator>
-#include <ostream>
 #include <sstream>
 #include <string>
 #include <utility>
+#include <vector>
 
 #include <Tarvek/Formats.h>
 #include "Support/TestSupport.h"
@@ -17,6 +19,7 @@ using Tarvek::Core::Property;
 using Tarvek::Core::PropertyException;
 using Tarvek::Core::WrongPropertyType;
 using TarvekTest::CatchAs;
+using TarvekTest::ChildNames;
 using TarvekTest::ItemOf;
 
 // root { a { x: 1, y { z: 2 } }, b: 3, s: "text" }
@@ -30,13 +33,6 @@ Property SampleTree() {
   return root;
 }
 
-// The names of the direct children, space-separated, to check presence and order at once.
-std::string ChildNames(const Property& node) {
-  std::string names;
-  for (const Property& child : node.GetChildren()) names += child.GetName() + " ";
-  return names;
-}
-
 TEST(PropertyTest, ConstructorsMakeTheTypeOfTheirValue) {
   const Property container("c");
   EXPECT_EQ(container.GetName(), "c");
@@ -44,45 +40,33 @@ TEST(PropertyTest, ConstructorsMakeTheTypeOfTheirValue) {
   EXPECT_TRUE(container.GetChildren().empty());
   EXPECT_TRUE(Property("b", true).GetBool());
   EXPECT_EQ(Property("i", 5000000000LL).GetInt64(), 5000000000LL);
-
   // A string literal must become a string, not a bool through pointer conversion.
-  const Property literal("s", "literal");
-  EXPECT_EQ(literal.GetType(), Tarvek::PropertyTypeString);
-  EXPECT_EQ(literal.GetString(), "literal");
+  EXPECT_EQ(Property("s", "literal").GetString(), "literal");
   EXPECT_EQ(Property("s", std::string("a\0b", 3)).GetString().size(), 3u);
-
   // Other integer types widen to int64, keeping sign or magnitude.
-  EXPECT_EQ(Property("i", -7).GetType(), Tarvek::PropertyTypeInt64);
   EXPECT_EQ(Property("i", -7).GetInt64(), -7);
   EXPECT_EQ(Property("u", 4000000000u).GetInt64(), 4000000000LL);
-}
-
-// The tag values are part of the binary interface and show as numbers in error reports.
-TEST(PropertyTest, TypeTagsKeepTheirValuesAndNames) {
-  EXPECT_EQ(Tarvek::PropertyTypeBool, 1);
-  EXPECT_EQ(Tarvek::PropertyTypeInt64, 2);
-  EXPECT_EQ(Tarvek::PropertyTypeString, 3);
-  EXPECT_EQ(Tarvek::PropertyTypeContainer, 6);
-  EXPECT_STREQ(Tarvek::PropertyTypeName(Tarvek::PropertyTypeInt64), "int64");
+  // The tag values are part of the binary interface and show as numbers in error reports.
+  EXPECT_EQ((std::vector<int>{Tarvek::PropertyTypeBool, Tarvek::PropertyTypeInt64,
+                              Tarvek::PropertyTypeString, Tarvek::PropertyTypeContainer}),
+            (std::vector<int>{1, 2, 3, 6}));
   EXPECT_STREQ(Tarvek::PropertyTypeName(static_cast<Tarvek::PropertyTypes>(4)), "unknown");
 }
 
-TEST(PropertyTest, CopyIsDeep) {
-  const Property original = SampleTree();
-  Property copy(original);
-  EXPECT_EQ(copy, original);
-  copy["a"]["y"].SetChildT<long long>("z", 99);
-  EXPECT_EQ(original["a"]["y"]["z"].GetInt64(), 2);
-}
-
-TEST(PropertyTest, CopyAssignmentKeepsTargetNameAndTakesTheRest) {
+// Copies are deep; copy-assignment keeps the target's name and takes type, value and children.
+TEST(PropertyTest, CopiesAreDeepAndAssignmentKeepsTheTargetName) {
+  const Property source = SampleTree();
+  Property copy(source);
+  EXPECT_EQ(copy, source);
   Property target("target");
   target.SetChildT<bool>("old", true);
-  const Property source = SampleTree();
   target = source;
   EXPECT_EQ(target.GetName(), "target");
   EXPECT_EQ(ChildNames(target), "a b s ");
   EXPECT_EQ(target["a"], source["a"]);
+  copy["a"]["y"].SetChildT<long long>("z", 99);
+  target["a"]["y"].SetChildT<long long>("z", 98);
+  EXPECT_EQ(source, SampleTree());
 
   Property leaf("leaf", 1);
   leaf = source;
@@ -109,8 +93,6 @@ TEST(PropertyTest, CopyAssignmentFromItselfOrADescendant) {
 
 TEST(PropertyTest, MoveAssignmentTakesTheName) {
   Property target("target");
-  target = SampleTree();
-  EXPECT_EQ(target, SampleTree());
   Property leaf("leaf", 5);
   target = std::move(leaf);
   EXPECT_EQ(target, Property("leaf", 5));
@@ -141,55 +123,39 @@ TEST(PropertyTest, ValueAssignmentMakesALeafAndDropsChildren) {
   EXPECT_EQ(node, Property("root", "text"));
 }
 
-TEST(PropertyTest, FindChildReturnsFirstDirectMatch) {
+// Look-ups find the first direct child of a name.
+TEST(PropertyTest, LookUpFindsTheFirstDirectChild) {
   Property root("root");
   root.CreateChildT<long long>("d", 1);
   root.CreateChildT<long long>("d", 2);
   root.SetChild("box").SetChildT<bool>("inner", true);
   const Property& view = root;
   EXPECT_EQ(root.FindChild("d"), root.GetChildren().begin());
-  EXPECT_EQ(view.FindChild("d")->GetInt64(), 1);
   EXPECT_EQ(view["d"].GetInt64(), 1);
   EXPECT_TRUE(view.ChildExists("box"));
   EXPECT_FALSE(view.ChildExists("inner"));  // grandchildren do not count
   EXPECT_EQ(view.FindChild("inner"), view.GetChildren().end());
-  EXPECT_EQ(root.FindChild("missing"), root.GetChildren().end());
-}
 
-TEST(PropertyTest, ConstIndexThrowsChildNotFound) {
-  const Property root = SampleTree();
-  const auto error = CatchAs<ChildNotFound>([&] { (void)root["missing"]; });
+  // The const operator[] never creates: it throws, naming node and child, for containers and
+  // leaves alike.
+  const auto error = CatchAs<ChildNotFound>([&] { (void)view["missing"]; });
   ASSERT_TRUE(error);
   EXPECT_EQ(ItemOf<PropertyException::PropertyNameInfo>(*error), "root");
   EXPECT_EQ(ItemOf<ChildNotFound::ChildNameInfo>(*error), "missing");
-  const auto description = ItemOf<Tarvek::DescriptionInfo>(*error);
-  ASSERT_TRUE(description);
-  EXPECT_NE(description->find("root"), std::string::npos) << *description;
-  EXPECT_NE(description->find("missing"), std::string::npos) << *description;
   EXPECT_TRUE(ItemOf<Tarvek::CallStackInfo>(*error));
-  EXPECT_EQ(ChildNames(root), "a b s ");  // nothing was created
-
-  // A leaf has no children, so the same error.
+  const std::string description = ItemOf<Tarvek::DescriptionInfo>(*error).value_or("");
+  EXPECT_NE(description.find("\"root\" has no child \"missing\""), std::string::npos)
+      << description;
+  EXPECT_EQ(ChildNames(root), "d d box ");
   const Property leaf("leaf", 1);
   EXPECT_TRUE(CatchAs<ChildNotFound>([&] { (void)leaf["x"]; }));
-}
 
-TEST(PropertyTest, NonConstIndexAppendsEmptyContainer) {
-  Property root = SampleTree();
-  Property& existing = root["b"];
-  EXPECT_EQ(&existing, &*std::next(root.GetChildren().begin()));
+  // The non-const operator[] appends an empty container for a missing name.
+  EXPECT_EQ(&root["box"], &*std::next(root.GetChildren().begin(), 2));
   Property& added = root["new"];
   EXPECT_EQ(&added, &root.GetChildren().back());
   EXPECT_EQ(added, Property("new"));
-  EXPECT_EQ(ChildNames(root), "a b s new ");
-
-  Property leaf("leaf", "v");
-  const auto error = CatchAs<MethodIsNotApplicable>([&] { (void)leaf["x"]; });
-  ASSERT_TRUE(error);
-  EXPECT_EQ(ItemOf<PropertyException::PropertyNameInfo>(*error), "leaf");
-  EXPECT_EQ(ItemOf<PropertyException::PropertyTypeInfo>(*error), Tarvek::PropertyTypeString);
-  EXPECT_EQ(ItemOf<PropertyException::MethodNameInfo>(*error), "operator[]");
-  EXPECT_EQ(leaf, Property("leaf", "v"));
+  EXPECT_EQ(ChildNames(root), "d d box new ");
 }
 
 TEST(PropertyTest, SetChildEmptiesOrAppendsInPlace) {
@@ -203,22 +169,11 @@ TEST(PropertyTest, SetChildEmptiesOrAppendsInPlace) {
   root.SetChild("c");
   EXPECT_EQ(ChildNames(root), "a b s c ");
 
-  Property leaf("leaf", false);
-  const auto error = CatchAs<MethodIsNotApplicable>([&] { leaf.SetChild("x"); });
-  ASSERT_TRUE(error);
-  EXPECT_EQ(ItemOf<PropertyException::MethodNameInfo>(*error), "SetChild");
-  EXPECT_TRUE(CatchAs<MethodIsNotApplicable>([&] { leaf.SetChild("x", Property("x")); }));
-  EXPECT_EQ(leaf, Property("leaf", false));
-}
-
-TEST(PropertyTest, SetChildWithValueKeepsKeyAndPosition) {
-  Property root = SampleTree();
-  const Property* a = &root["a"];
+  // With a value: the child keeps its key and its position.
   EXPECT_EQ(&root.SetChild("a", Property("other", "v")), a);
   EXPECT_EQ(*a, Property("a", "v"));
-  root.SetChild("d", Property("other", 4));
-  EXPECT_EQ(ChildNames(root), "a b s d ");
-  EXPECT_EQ(root["d"].GetInt64(), 4);
+  EXPECT_EQ(root.SetChild("d", Property("other", 4)), Property("d", 4));
+  EXPECT_EQ(ChildNames(root), "a b s c d ");
 }
 
 TEST(PropertyTest, SetChildWithTheNodeItself) {
@@ -232,7 +187,6 @@ TEST(PropertyTest, SetChildWithTheNodeItself) {
   Property expected = before;
   expected.SetChild("c", before);
   EXPECT_EQ(root, expected);
-  EXPECT_EQ(ChildNames(root["c"]), "a b ");
 
   // Replaced in place: child "a" takes the node's content, including the old "a".
   root = before;
@@ -242,9 +196,86 @@ TEST(PropertyTest, SetChildWithTheNodeItself) {
   EXPECT_EQ(root["a"]["a"].GetInt64(), 1);
 }
 
+TEST(PropertyTest, SetChildTSetsTheFirstChildInPlaceOrAppends) {
+  Property root("root");
+  Property& first = root.SetChildT<long long>("first", 1);
+  EXPECT_EQ(root.SetChildT<bool>("flag", true), Property("flag", true));
+  const Property& text = root.SetChildT<std::string>("text", "v");
+  EXPECT_EQ(&text, &root.GetChildren().back());
+
+  EXPECT_EQ(&root.SetChildT<long long>("first", 10), &first);
+  EXPECT_EQ(first, Property("first", 10));
+  EXPECT_EQ(ChildNames(root), "first flag text ");
+  // The reference stays valid while more children are appended.
+  for (int i = 0; i < 50; ++i) root.SetChildT<long long>("more" + std::to_string(i), i);
+  EXPECT_EQ(&root.SetChildT<long long>("first", 11), &first);
+  EXPECT_EQ(first, Property("first", 11));
+  EXPECT_EQ(root.GetChildren().size(), 53u);
+
+  // Another type retypes the child; a container turns leaf and drops its children.
+  Property& box = root.SetChild("box");
+  box.SetChildT<bool>("inner", true);
+  EXPECT_EQ(root.SetChildT<std::string>("first", "one"), Property("first", "one"));
+  EXPECT_EQ(&root.SetChildT<bool>("box", false), &box);
+  EXPECT_EQ(box, Property("box", false));
+}
+
+// CreateChildT appends even when the name is taken; SetChildT then sets the first only.
+TEST(PropertyTest, CreateChildTAlwaysAppends) {
+  Property root("root");
+  Property& one = root.CreateChildT<std::string>("item", "one");
+  Property& two = root.CreateChildT<std::string>("item", "two");
+  EXPECT_EQ(&two, &root.GetChildren().back());
+  EXPECT_EQ(ChildNames(root), "item item ");
+  EXPECT_EQ(&root.SetChildT<std::string>("item", "new"), &one);
+  EXPECT_EQ(one.GetString(), "new");
+  EXPECT_EQ(two.GetString(), "two");
+}
+
+// Adding a child to a leaf is refused, the leaf unchanged, with items naming node and method.
+// The typed helpers record their throw statements in Property.h; the others in the library.
+TEST(PropertyTest, LeavesRefuseChildren) {
+  struct Refusal {
+    const char* method;
+    int line;  // 0: not pinned
+    const char* valueType;
+    std::function<void(Property&)> call;
+  };
+  const Refusal refusals[] = {
+      {"SetChildT", 257, "bool", [](Property& p) { p.SetChildT<bool>("c", true); }},
+      {"SetChildT", 257, "long long", [](Property& p) { p.SetChildT<long long>("c", 1); }},
+      {"SetChildT", 257, "std::basic_string<char>",
+       [](Property& p) { p.SetChildT<std::string>("c", "x"); }},
+      {"CreateChildT", 240, "bool", [](Property& p) { p.CreateChildT<bool>("c", true); }},
+      {"CreateChildT", 240, "long long", [](Property& p) { p.CreateChildT<long long>("c", 1); }},
+      {"CreateChildT", 240, "std::basic_string<char>",
+       [](Property& p) { p.CreateChildT<std::string>("c", "x"); }},
+      {"operator[]", 0, "", [](Property& p) { (void)p["c"]; }},
+      {"SetChild", 0, "", [](Property& p) { p.SetChild("c"); }},
+      {"SetChild", 0, "", [](Property& p) { p.SetChild("c", Property("c")); }},
+  };
+  for (const Property& leaf : {Property("flag", false), Property("count", 3), Property("t", "v")}) {
+    for (const Refusal& refusal : refusals) {
+      SCOPED_TRACE(leaf.GetName() + " / " + refusal.method + " " + refusal.valueType);
+      Property node = leaf;
+      const auto error = CatchAs<MethodIsNotApplicable>([&] { refusal.call(node); });
+      ASSERT_TRUE(error);
+      EXPECT_EQ(node, leaf);
+      EXPECT_EQ(ItemOf<PropertyException::PropertyNameInfo>(*error), leaf.GetName());
+      EXPECT_EQ(ItemOf<PropertyException::PropertyTypeInfo>(*error), leaf.GetType());
+      EXPECT_EQ(ItemOf<PropertyException::MethodNameInfo>(*error), refusal.method);
+      EXPECT_FALSE(ItemOf<Tarvek::CallStackInfo>(*error).value_or("").empty());
+      EXPECT_FALSE(ItemOf<Tarvek::DescriptionInfo>(*error));
+      if (refusal.line == 0) continue;
+      TarvekTest::ExpectThrownAt(*error, "Core/Interfaces/Property.h", refusal.line,
+                                 std::string("Tarvek::Core::Property &Tarvek::Core::Property::") +
+                                     refusal.method + "(const std::string &, const " +
+                                     refusal.valueType + " &)");
+    }
+  }
+}
+
 TEST(PropertyTest, TypedGettersThrowWrongPropertyType) {
-  const Property nodes[] = {Property("n", true), Property("n", 1), Property("n", "s"),
-                            Property("n")};
   struct Getter {
     Tarvek::PropertyTypes type;
     const char* name;
@@ -255,7 +286,8 @@ TEST(PropertyTest, TypedGettersThrowWrongPropertyType) {
       {Tarvek::PropertyTypeInt64, "GetInt64", [](const Property& p) { (void)p.GetInt64(); }},
       {Tarvek::PropertyTypeString, "GetString", [](const Property& p) { (void)p.GetString(); }},
   };
-  for (const Property& node : nodes) {
+  for (const Property& node :
+       {Property("n", true), Property("n", 1), Property("n", "s"), Property("n")}) {
     for (const Getter& getter : getters) {
       if (node.GetType() == getter.type) continue;
       SCOPED_TRACE(std::string(getter.name) + " on " + Tarvek::PropertyTypeName(node.GetType()));
@@ -276,7 +308,7 @@ TEST(PropertyTest, EqualityIsDeepOrderedAndNamed) {
   const Property tree = SampleTree();
   Property renamed("other");
   renamed = tree;  // copy-assignment keeps the name "other"
-  EXPECT_NE(renamed, tree);
+  EXPECT_NE(renamed, SampleTree());
 
   Property deep = SampleTree();
   deep["a"]["y"].SetChildT<long long>("z", 3);
@@ -294,41 +326,34 @@ TEST(PropertyTest, EqualityIsDeepOrderedAndNamed) {
   EXPECT_FALSE(Property("p", 1) != Property("p", 1));
 }
 
-// A tree with every leaf type, bytes that must be escaped, UTF-8, and an unnamed node.
-Property PrintSample() {
-  Property root("root");
-  root.SetChildT<bool>("flag", true);
-  root.SetChildT<long long>("count", -3);
-  root.SetChildT<std::string>("text", std::string("q\"b\\n\nt\tr\r\x01\x7f\0", 13));
-  root.SetChild("").SetChildT<std::string>("na\"me", "\xc3\xa9");
-  return root;
-}
-
 std::string Print(const Property& node, int indent, bool showTypes, bool recursive) {
   std::ostringstream out;
   Tarvek::Core::PrintPropertyValue(node, indent, out, showTypes, recursive);
   return out.str();
 }
 
+// Every leaf type, bytes that must be escaped, UTF-8, an unnamed node, and the flags.
 TEST(PropertyTest, PrintsIndentedTreeWithEscapes) {
-  EXPECT_EQ(Print(PrintSample(), 1, true, true),
+  Property root("root");
+  root.SetChildT<bool>("flag", true);
+  root.SetChildT<long long>("count", -3);
+  root.SetChildT<std::string>("text", std::string("q\"b\\n\nt\tr\r\x01\x7f\0", 13));
+  root.SetChild("").SetChildT<std::string>("na\"me", "\xc3\xa9");
+  EXPECT_EQ(Print(root, 1, true, true),
             "  root (container)\n"
             "    flag (bool): true\n"
             "    count (int64): -3\n"
             "    text (string): \"q\\\"b\\\\n\\nt\\tr\\r\\x01\\x7f\\x00\"\n"
             "    <unnamed> (container)\n"
             "      na\\\"me (string): \"\xc3\xa9\"\n");
-}
-
-TEST(PropertyTest, PrintFlagsDropTypesAndChildren) {
-  EXPECT_EQ(Print(PrintSample(), 0, false, true),
+  EXPECT_EQ(Print(root, 0, false, true),
             "root\n"
             "  flag: true\n"
             "  count: -3\n"
             "  text: \"q\\\"b\\\\n\\nt\\tr\\r\\x01\\x7f\\x00\"\n"
             "  <unnamed>\n"
             "    na\\\"me: \"\xc3\xa9\"\n");
-  EXPECT_EQ(Print(PrintSample(), 2, true, false), "    root (container)\n");
+  EXPECT_EQ(Print(root, 2, true, false), "    root (container)\n");
   EXPECT_EQ(Print(Property("f", false), 0, false, false), "f: false\n");
   EXPECT_EQ(Print(Property("e", ""), 0, true, true), "e (string): \"\"\n");
 }

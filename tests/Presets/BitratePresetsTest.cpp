@@ -5,8 +5,11 @@
 
 #include <algorithm>
 #include <cstdint>
+#include <functional>
 #include <limits>
+#include <ostream>
 #include <string>
+#include <type_traits>
 #include <utility>
 #include <vector>
 
@@ -21,7 +24,10 @@ using TarvekTest::ItemOf;
 
 struct Trio {
   std::int64_t min, def, max;
+  bool operator==(const Trio& o) const { return min == o.min && def == o.def && max == o.max; }
 };
+
+void PrintTo(const Trio& t, std::ostream* out) { *out << t.min << "/" << t.def << "/" << t.max; }
 
 Trio Video(const std::string& id, long long w, long long h, double fps, int quality) {
   return {GetMinVideoBitrate(id, w, h, fps, quality),
@@ -69,58 +75,44 @@ std::string DescriptionOf(Call call) {
 
 class VideoPresetTest : public ::testing::TestWithParam<std::string> {};
 
-TEST_P(VideoPresetTest, MinDefaultMaxAreOrderedOverTheGrid) {
-  for (const auto& [w, h] : kSizes)
-    for (double fps : kFrameRates)
-      for (int q : kQualities)
-        ExpectOrdered(Video(GetParam(), w, h, fps, q), std::to_string(w) + "x" + std::to_string(h) +
-                                                           "@" + std::to_string(fps) + " q" +
-                                                           std::to_string(q));
+// Over the grid: min <= default <= max, and no figure falls as the picture grows or the frame
+// rate rises; no default rises with a higher quality number (from 0 up: -1 means none).
+TEST_P(VideoPresetTest, OrderedAndMonotonicOverTheGrid) {
+  const std::string& id = GetParam();
+  for (std::size_t s = 0; s < kSizes.size(); ++s) {
+    const auto& [w, h] = kSizes[s];
+    for (std::size_t r = 0; r < kFrameRates.size(); ++r) {
+      const double fps = kFrameRates[r];
+      for (std::size_t q = 0; q < kQualities.size(); ++q) {
+        const int quality = kQualities[q];
+        const std::string where = std::to_string(w) + "x" + std::to_string(h) + "@" +
+                                  std::to_string(fps) + " q" + std::to_string(quality);
+        const Trio trio = Video(id, w, h, fps, quality);
+        ExpectOrdered(trio, where);
+        if (s > 0) {
+          ExpectNotBelow(trio, Video(id, kSizes[s - 1].first, kSizes[s - 1].second, fps, quality),
+                         where);
+        }
+        if (r > 0) ExpectNotBelow(trio, Video(id, w, h, kFrameRates[r - 1], quality), where);
+        if (q > 1) {
+          EXPECT_LE(trio.def, Video(id, w, h, fps, kQualities[q - 1]).def) << where;
+        }
+      }
+    }
+  }
 }
 
-TEST_P(VideoPresetTest, NeverFallsAsPicturesGrow) {
-  for (double fps : kFrameRates)
-    for (int q : kQualities)
-      for (std::size_t i = 1; i < kSizes.size(); ++i)
-        ExpectNotBelow(Video(GetParam(), kSizes[i].first, kSizes[i].second, fps, q),
-                       Video(GetParam(), kSizes[i - 1].first, kSizes[i - 1].second, fps, q),
-                       std::to_string(kSizes[i].first) + " wide @" + std::to_string(fps));
-}
-
-TEST_P(VideoPresetTest, NeverFallsAsFrameRateRises) {
-  for (const auto& [w, h] : kSizes)
-    for (int q : kQualities)
-      for (std::size_t i = 1; i < kFrameRates.size(); ++i)
-        ExpectNotBelow(Video(GetParam(), w, h, kFrameRates[i], q),
-                       Video(GetParam(), w, h, kFrameRates[i - 1], q),
-                       std::to_string(w) + " wide @" + std::to_string(kFrameRates[i]));
-}
-
-TEST_P(VideoPresetTest, AHigherQualityNumberNeverRaisesTheBitrate) {
-  for (std::size_t i = 2; i < kQualities.size(); ++i)  // from 0 up; -1 is "none"
-    EXPECT_LE(GetDefaultVideoBitrate(GetParam(), 1280, 720, 30, kQualities[i]),
-              GetDefaultVideoBitrate(GetParam(), 1280, 720, 30, kQualities[i - 1]))
-        << "q" << kQualities[i];
-}
-
-TEST_P(VideoPresetTest, UnknownFrameRateIsTakenAs30) {
-  const Trio unknown = Video(GetParam(), 1920, 1080, 0.0, -1);
-  const Trio nominal = Video(GetParam(), 1920, 1080, 30.0, -1);
-  EXPECT_EQ(unknown.min, nominal.min);
-  EXPECT_EQ(unknown.def, nominal.def);
-  EXPECT_EQ(unknown.max, nominal.max);
-}
-
-TEST_P(VideoPresetTest, ExtremeInputsAreClampedToTheLargestPictureAndRate) {
-  const long long huge = 4294967295LL;
-  const Trio extreme = Video(GetParam(), huge, huge, 1e300, std::numeric_limits<int>::max());
-  const Trio largest = Video(GetParam(), 65536, 65536, 240, std::numeric_limits<int>::max());
-  EXPECT_EQ(extreme.def, largest.def);
-  EXPECT_EQ(extreme.max, largest.max);
-  ExpectOrdered(extreme, "extreme");
-  EXPECT_LT(extreme.max, 100'000'000'000'000LL);  // far from overflow
-  EXPECT_EQ(GetDefaultVideoBitrate(GetParam(), 1280, 720, 1e-300, -1),
-            GetDefaultVideoBitrate(GetParam(), 1280, 720, 1.0, -1));
+// A frame rate of 0 is taken as 30; pictures, rates and qualities beyond the scales count as
+// their ends, and the figures stay far from overflow.
+TEST_P(VideoPresetTest, UnknownAndExtremeInputs) {
+  const std::string& id = GetParam();
+  EXPECT_EQ(Video(id, 1920, 1080, 0.0, -1), Video(id, 1920, 1080, 30.0, -1));
+  const int top = std::numeric_limits<int>::max();
+  const Trio extreme = Video(id, 4294967295LL, 4294967295LL, 1e300, top);
+  const Trio largest = Video(id, 65536, 65536, 240, top);
+  EXPECT_EQ(extreme, largest);
+  EXPECT_LT(extreme.max, 100'000'000'000'000LL);
+  EXPECT_EQ(Video(id, 1280, 720, 1e-300, -1), Video(id, 1280, 720, 1.0, -1));
 }
 
 INSTANTIATE_TEST_SUITE_P(AllVideoCodecs, VideoPresetTest,
@@ -150,28 +142,22 @@ class AudioPresetTest : public ::testing::TestWithParam<std::string> {
 const std::vector<long long> kSampleRates = {8000,  11025, 16000, 22050, 24000, 32000,
                                              44100, 48000, 88200, 96000, 192000};
 
-TEST_P(AudioPresetTest, MinDefaultMaxAreOrderedOverTheGrid) {
-  for (int n : CarriedChannels())
-    for (long long rate : kSampleRates)
-      ExpectOrdered(Audio(GetParam(), rate, Channels(n)),
-                    std::to_string(n) + " ch @" + std::to_string(rate));
-}
-
-TEST_P(AudioPresetTest, NeverFallsWithMoreChannels) {
+// Over the grid: min <= default <= max, and no figure falls with more channels or a higher
+// sample rate.
+TEST_P(AudioPresetTest, OrderedAndMonotonicOverTheGrid) {
   const std::vector<int> carried = CarriedChannels();
-  for (long long rate : kSampleRates)
-    for (std::size_t i = 1; i < carried.size(); ++i)
-      ExpectNotBelow(Audio(GetParam(), rate, Channels(carried[i])),
-                     Audio(GetParam(), rate, Channels(carried[i - 1])),
-                     std::to_string(carried[i]) + " ch @" + std::to_string(rate));
-}
-
-TEST_P(AudioPresetTest, NeverFallsWithAHigherSampleRate) {
-  for (int n : CarriedChannels())
-    for (std::size_t i = 1; i < kSampleRates.size(); ++i)
-      ExpectNotBelow(Audio(GetParam(), kSampleRates[i], Channels(n)),
-                     Audio(GetParam(), kSampleRates[i - 1], Channels(n)),
-                     std::to_string(n) + " ch @" + std::to_string(kSampleRates[i]));
+  for (std::size_t c = 0; c < carried.size(); ++c) {
+    for (std::size_t r = 0; r < kSampleRates.size(); ++r) {
+      const std::string where =
+          std::to_string(carried[c]) + " ch @" + std::to_string(kSampleRates[r]);
+      const Trio trio = Audio(GetParam(), kSampleRates[r], Channels(carried[c]));
+      ExpectOrdered(trio, where);
+      if (c > 0)
+        ExpectNotBelow(trio, Audio(GetParam(), kSampleRates[r], Channels(carried[c - 1])), where);
+      if (r > 0)
+        ExpectNotBelow(trio, Audio(GetParam(), kSampleRates[r - 1], Channels(carried[c])), where);
+    }
+  }
 }
 
 INSTANTIATE_TEST_SUITE_P(AllAudioCodecs, AudioPresetTest,
@@ -258,46 +244,44 @@ TEST(BitratePresetsTest, AudioSpotValuesMatchThePublishedFigures) {
             Audio("flac", 44100, stereo, AV_SAMPLE_FMT_S16).def);
 }
 
-TEST(BitratePresetsTest, UnknownCodecsAreNamedInTheError) {
-  const std::string video =
-      DescriptionOf<UnknownCodecError>([] { GetDefaultVideoBitrate("h266", 640, 360, 30, -1); });
-  EXPECT_NE(video.find("h266"), std::string::npos) << video;
-  const std::string crossed =
-      DescriptionOf<UnknownCodecError>([] { GetMaxVideoBitrate("opus", 640, 360, 30, -1); });
-  EXPECT_NE(crossed.find("opus"), std::string::npos) << crossed;
-  const std::string audio = DescriptionOf<UnknownCodecError>(
-      [] { GetMinAudioBitrate("h264", 48000, CH_LAYOUT_STEREO, AV_SAMPLE_FMT_S16); });
-  EXPECT_NE(audio.find("h264"), std::string::npos) << audio;
-  EXPECT_TRUE(CatchAs<ConfException>([] { GetDefaultVideoBitrate("nope", 640, 360, 30, -1); }));
-}
-
+// Each refusal is of its own class, a ConfException, and its description names the offending
+// value.
+static_assert(std::is_base_of_v<ConfException, UnknownCodecError> &&
+              std::is_base_of_v<ConfException, InvalidPresetArgumentError>);
 TEST(BitratePresetsTest, BadArgumentsAreNamedInTheError) {
   const double nan = std::numeric_limits<double>::quiet_NaN();
   const double inf = std::numeric_limits<double>::infinity();
-  const auto videoError = [](long long w, long long h, double fps) {
-    return DescriptionOf<InvalidPresetArgumentError>(
-        [=] { GetDefaultVideoBitrate("h264", w, h, fps, -1); });
+  const auto video = [](const char* id, long long w, long long h, double fps) {
+    return [=] { GetDefaultVideoBitrate(id, w, h, fps, -1); };
   };
-  const auto audioError = [](const char* id, long long rate, unsigned mask, AVSampleFormat f) {
-    return DescriptionOf<InvalidPresetArgumentError>(
-        [=] { GetDefaultAudioBitrate(id, rate, static_cast<ChannelLayout>(mask), f); });
+  const auto audio = [](const char* id, long long rate, unsigned mask, AVSampleFormat f) {
+    return [=] { GetMinAudioBitrate(id, rate, static_cast<ChannelLayout>(mask), f); };
   };
-  EXPECT_NE(videoError(0, 1080, 30).find("Width 0"), std::string::npos);
-  EXPECT_NE(videoError(1920, -1, 30).find("Height -1"), std::string::npos);
-  EXPECT_NE(videoError(1920, 1080, -25).find("Frame rate -25"), std::string::npos);
-  EXPECT_NE(videoError(1920, 1080, nan).find("Frame rate nan"), std::string::npos);
-  EXPECT_NE(videoError(1920, 1080, inf).find("Frame rate inf"), std::string::npos);
-  EXPECT_NE(audioError("aac", 0, 3, AV_SAMPLE_FMT_S16).find("Sample rate 0"), std::string::npos);
-  EXPECT_NE(audioError("pcm_s16le", 4294967296LL, 3, AV_SAMPLE_FMT_S16).find("4294967296"),
-            std::string::npos);
-  EXPECT_NE(audioError("aac", 48000, 0, AV_SAMPLE_FMT_S16).find("Channel layout 0x0"),
-            std::string::npos);
-  EXPECT_NE(audioError("mp3", 48000, 0x60F, AV_SAMPLE_FMT_S16).find("mp3"), std::string::npos);
-  EXPECT_NE(audioError("flac", 48000, 3, AV_SAMPLE_FMT_NONE).find("Sample format -1"),
-            std::string::npos);
-  EXPECT_NE(audioError("alac", 48000, 3, AV_SAMPLE_FMT_FLT).find("flt"), std::string::npos);
-  // Every one of them is also a ConfException.
-  EXPECT_TRUE(CatchAs<ConfException>([] { GetMinVideoBitrate("h264", 0, 0, 30, -1); }));
+  const std::pair<std::function<void()>, const char*> unknownCodecs[] = {
+      {video("h266", 640, 360, 30), "h266"},
+      {[] { GetMaxVideoBitrate("opus", 640, 360, 30, -1); }, "opus"},
+      {audio("h264", 48000, 3, AV_SAMPLE_FMT_S16), "h264"},
+  };
+  for (const auto& [call, named] : unknownCodecs) {
+    EXPECT_NE(DescriptionOf<UnknownCodecError>(call).find(named), std::string::npos) << named;
+  }
+  const std::pair<std::function<void()>, const char*> invalidArguments[] = {
+      {video("h264", 0, 1080, 30), "Width 0"},
+      {video("h264", 1920, -1, 30), "Height -1"},
+      {video("h264", 1920, 1080, -25), "Frame rate -25"},
+      {video("h264", 1920, 1080, nan), "Frame rate nan"},
+      {video("h264", 1920, 1080, inf), "Frame rate inf"},
+      {audio("aac", 0, 3, AV_SAMPLE_FMT_S16), "Sample rate 0"},
+      {audio("pcm_s16le", 4294967296LL, 3, AV_SAMPLE_FMT_S16), "4294967296"},
+      {audio("aac", 48000, 0, AV_SAMPLE_FMT_S16), "Channel layout 0x0"},
+      {audio("mp3", 48000, 0x60F, AV_SAMPLE_FMT_S16), "mp3"},
+      {audio("flac", 48000, 3, AV_SAMPLE_FMT_NONE), "Sample format -1"},
+      {audio("alac", 48000, 3, AV_SAMPLE_FMT_FLT), "flt"},
+  };
+  for (const auto& [call, named] : invalidArguments) {
+    const std::string description = DescriptionOf<InvalidPresetArgumentError>(call);
+    EXPECT_NE(description.find(named), std::string::npos) << named << ": " << description;
+  }
 }
 
 }  // namespace

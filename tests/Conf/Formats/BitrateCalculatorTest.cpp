@@ -1,23 +1,79 @@
 // The bitrate functions: the kind check and its error, what reaches the presets look-ups, and
-// that the description's reference count is the same after every call, however it ends.
+// that the description's reference count is the same after every call, however it ends. This
+// program defines the six look-ups itself, as a stand-in for the presets library that records
+// what it is handed, and links the bitrate functions against it.
 #include <gtest/gtest.h>
 
-#include <boost/exception/all.hpp>
+#include <cctype>
+#include <cstdint>
 #include <stdexcept>
+#include <string>
+#include <tuple>
+#include <utility>
 
-#include "Conf/Formats/RecordingPresets.h"
 #include "Support/TestSupport.h"
 
 namespace {
 
-using Tarvek::Conf::ConfException;
-using Tarvek::Conf::FormatCodecAudio;
-using Tarvek::Conf::FormatCodecVideo;
-using Tarvek::Conf::IFormatCodec;
-using Tarvek::Conf::IFormatCodecAudio;
-using Tarvek::Conf::IFormatCodecVideo;
+using namespace Tarvek::Conf;
 using TarvekTest::CatchAs;
 using TarvekTest::ItemOf;
+
+// The last call to any of the six look-ups.
+struct Call {
+  std::string function;  // e.g. "GetMinVideoBitrate"; empty when nothing was called
+  std::string codecId;
+  long long width = 0, height = 0;
+  double frameRate = 0.0;
+  int quality = 0;
+  long long sampleRate = 0;
+  ChannelLayout layout{};
+  AVSampleFormat sampleFormat = AV_SAMPLE_FMT_NONE;
+};
+
+// A call's fields side by side, for comparison and printing.
+auto Fields(const Call& c) {
+  return std::tie(c.function, c.codecId, c.width, c.height, c.frameRate, c.quality, c.sampleRate,
+                  c.layout, c.sampleFormat);
+}
+
+Call last;
+bool failNext = false;  // makes the next look-up throw std::runtime_error
+
+std::int64_t Record(Call call, std::int64_t answer) {
+  last = std::move(call);
+  if (std::exchange(failNext, false)) throw std::runtime_error("presets failure");
+  return answer;
+}
+
+}  // namespace
+
+// The stand-in: a distinct answer per look-up, so a test sees which one answered.
+namespace Tarvek {
+namespace Conf {
+
+#define TARVEK_VIDEO_LOOK_UP(Name, answer)                                                \
+  std::int64_t Name(const std::string& id, long long w, long long h, double fps, int q) { \
+    return Record({#Name, id, w, h, fps, q}, answer);                                     \
+  }
+#define TARVEK_AUDIO_LOOK_UP(Name, answer)                                       \
+  std::int64_t Name(const std::string& id, long long rate, ChannelLayout layout, \
+                    AVSampleFormat format) {                                     \
+    return Record({#Name, id, 0, 0, 0.0, 0, rate, layout, format}, answer);      \
+  }
+TARVEK_VIDEO_LOOK_UP(GetDefaultVideoBitrate, 1001)
+TARVEK_VIDEO_LOOK_UP(GetMinVideoBitrate, 1002)
+TARVEK_VIDEO_LOOK_UP(GetMaxVideoBitrate, 1003)
+TARVEK_AUDIO_LOOK_UP(GetDefaultAudioBitrate, 2001)
+TARVEK_AUDIO_LOOK_UP(GetMinAudioBitrate, 2002)
+TARVEK_AUDIO_LOOK_UP(GetMaxAudioBitrate, 2003)
+#undef TARVEK_VIDEO_LOOK_UP
+#undef TARVEK_AUDIO_LOOK_UP
+
+}  // namespace Conf
+}  // namespace Tarvek
+
+namespace {
 
 using Calculator = boost::int64_t (*)(const boost::intrusive_ptr<const IFormatCodec>&);
 
@@ -26,24 +82,18 @@ struct Function {
   Calculator calculate;
   bool video;
   int throwLine;
-  std::int64_t answer;  // what the recording stand-in returns for this function
+  std::int64_t answer;  // what the stand-in returns for this function
 };
 
 void PrintTo(const Function& function, std::ostream* out) { *out << function.name; }
 
 const Function kFunctions[] = {
-    {"GetDefaultVideoBitrate", &Tarvek::Conf::GetDefaultVideoBitrate, true, 16,
-     RecordingPresets::kDefaultVideo},
-    {"GetMinVideoBitrate", &Tarvek::Conf::GetMinVideoBitrate, true, 42,
-     RecordingPresets::kMinVideo},
-    {"GetMaxVideoBitrate", &Tarvek::Conf::GetMaxVideoBitrate, true, 67,
-     RecordingPresets::kMaxVideo},
-    {"GetDefaultAudioBitrate", &Tarvek::Conf::GetDefaultAudioBitrate, false, 94,
-     RecordingPresets::kDefaultAudio},
-    {"GetMinAudioBitrate", &Tarvek::Conf::GetMinAudioBitrate, false, 110,
-     RecordingPresets::kMinAudio},
-    {"GetMaxAudioBitrate", &Tarvek::Conf::GetMaxAudioBitrate, false, 125,
-     RecordingPresets::kMaxAudio},
+    {"GetDefaultVideoBitrate", &GetDefaultVideoBitrate, true, 16, 1001},
+    {"GetMinVideoBitrate", &GetMinVideoBitrate, true, 42, 1002},
+    {"GetMaxVideoBitrate", &GetMaxVideoBitrate, true, 67, 1003},
+    {"GetDefaultAudioBitrate", &GetDefaultAudioBitrate, false, 94, 2001},
+    {"GetMinAudioBitrate", &GetMinAudioBitrate, false, 110, 2002},
+    {"GetMaxAudioBitrate", &GetMaxAudioBitrate, false, 125, 2003},
 };
 
 boost::intrusive_ptr<IFormatCodecVideo> FullVideo() {
@@ -60,100 +110,88 @@ boost::intrusive_ptr<IFormatCodecAudio> FullAudio() {
   auto audio = FormatCodecAudio::Create();
   audio->SetCodecID("aac");
   audio->SetSampleRate(48000);
-  audio->SetChannelLayout(Tarvek::Conf::CH_LAYOUT_5POINT1);
+  audio->SetChannelLayout(CH_LAYOUT_5POINT1);
   audio->SetSampleFormat(AV_SAMPLE_FMT_FLTP);
   return audio;
 }
 
 class BitrateCalculatorTest : public ::testing::TestWithParam<Function> {
  protected:
-  void SetUp() override { RecordingPresets::Reset(); }
+  void SetUp() override { last = Call{}; }
+};
 
-  // Calls the function under test and checks that it refused `codec` as the wrong kind.
-  void ExpectIncompatible(const boost::intrusive_ptr<const IFormatCodec>& codec) {
-    const Function& f = GetParam();
-    const int countBefore = codec ? codec->GetRefCount() : 0;
+// Null and every other kind are refused at the function's own throw site, before any look-up,
+// and the description gets its reference back.
+TEST_P(BitrateCalculatorTest, RefusesEveryOtherKind) {
+  const Function& f = GetParam();
+  const boost::intrusive_ptr<const IFormatCodec> wrongKinds[] = {
+      nullptr, FormatCodec::Create(), FormatCodecSubtitle::Create(),
+      f.video ? boost::intrusive_ptr<const IFormatCodec>(FullAudio()) : FullVideo()};
+  for (const auto& codec : wrongKinds) {
     const auto error = CatchAs<ConfException>([&] { f.calculate(codec); });
     ASSERT_TRUE(error);
     EXPECT_EQ(ItemOf<Tarvek::DescriptionInfo>(*error),
               "Incompatible type of IFormatCodec structure");
-    EXPECT_TRUE(ItemOf<Tarvek::CallStackInfo>(*error).has_value());
-    EXPECT_STREQ(ItemOf<boost::throw_file>(*error).value_or(""),
-                 "Conf/Formats/BitrateCalculator.cpp");
-    EXPECT_EQ(ItemOf<boost::throw_line>(*error), f.throwLine);
-    EXPECT_EQ(std::string(ItemOf<boost::throw_function>(*error).value_or("")),
-              std::string("boost::int64_t Tarvek::Conf::") + f.name +
-                  "(const boost::intrusive_ptr<const IFormatCodec> &)");
-    EXPECT_TRUE(RecordingPresets::Last().function.empty()) << "the look-up must not be called";
+    EXPECT_TRUE(ItemOf<Tarvek::CallStackInfo>(*error));
+    TarvekTest::ExpectThrownAt(*error, "Conf/Formats/BitrateCalculator.cpp", f.throwLine,
+                               std::string("boost::int64_t Tarvek::Conf::") + f.name +
+                                   "(const boost::intrusive_ptr<const IFormatCodec> &)");
+    EXPECT_TRUE(last.function.empty()) << "the look-up must not be called";
     if (codec) {
-      EXPECT_EQ(codec->GetRefCount(), countBefore);
+      EXPECT_EQ(codec->GetRefCount(), 1);
     }
   }
-
-  // A description of the right kind for the function under test, with every setting it reads.
-  static boost::intrusive_ptr<const IFormatCodec> RightKind() {
-    if (GetParam().video) return FullVideo();
-    return FullAudio();
-  }
-};
-
-TEST_P(BitrateCalculatorTest, RefusesAnEmptyPointer) { ExpectIncompatible(nullptr); }
-
-TEST_P(BitrateCalculatorTest, RefusesEveryOtherKind) {
-  ExpectIncompatible(Tarvek::Conf::FormatCodec::Create());
-  ExpectIncompatible(Tarvek::Conf::FormatCodecSubtitle::Create());
-  if (GetParam().video) {
-    ExpectIncompatible(FullAudio());
-  } else {
-    ExpectIncompatible(FullVideo());
-  }
 }
 
-TEST_P(BitrateCalculatorTest, CallsItsOwnLookUpAndReturnsItsAnswerUnchanged) {
-  const auto codec = RightKind();
-  EXPECT_EQ(GetParam().calculate(codec), GetParam().answer);
-  EXPECT_EQ(RecordingPresets::Last().function, GetParam().name);
+// The settings reach the function's own look-up unchanged, and its answer comes back.
+TEST_P(BitrateCalculatorTest, CallsItsOwnLookUpAndGivesTheReferenceBackHoweverItEnds) {
+  const Function& f = GetParam();
+  const boost::intrusive_ptr<IFormatCodec> codec =
+      f.video ? boost::intrusive_ptr<IFormatCodec>(FullVideo()) : FullAudio();
+  EXPECT_EQ(f.calculate(codec), f.answer);
+  const Call expected =
+      f.video ? Call{f.name, "h264", 1920, 1080, 30000.0 / 1001.0, 23}
+              : Call{f.name, "aac", 0, 0, 0.0, 0, 48000, CH_LAYOUT_5POINT1, AV_SAMPLE_FMT_FLTP};
+  EXPECT_EQ(Fields(last), Fields(expected));
   EXPECT_EQ(codec->GetRefCount(), 1);
-}
 
-TEST_P(BitrateCalculatorTest, GivesTheReferenceBackWhenTheLookUpOrASettingFails) {
-  const auto codec = RightKind();
-  RecordingPresets::FailNextCall();
-  EXPECT_THROW(GetParam().calculate(codec), std::runtime_error);
+  failNext = true;
+  EXPECT_THROW(f.calculate(codec), std::runtime_error);
   EXPECT_EQ(codec->GetRefCount(), 1);
 
-  Tarvek::Core::Property empty("empty");
-  const_cast<IFormatCodec&>(*codec).SetProperty(empty);
-  EXPECT_THROW(GetParam().calculate(codec), Tarvek::Core::ChildNotFound);
+  codec->SetProperty(Tarvek::Core::Property("empty"));
+  EXPECT_THROW(f.calculate(codec), Tarvek::Core::ChildNotFound);
   EXPECT_EQ(codec->GetRefCount(), 1);
 }
 
 INSTANTIATE_TEST_SUITE_P(AllSix, BitrateCalculatorTest, ::testing::ValuesIn(kFunctions),
-                         [](const ::testing::TestParamInfo<Function>& info) {
-                           return std::string(info.param.name);
-                         });
+                         [](const auto& info) { return std::string(info.param.name); });
 
 class VideoArgumentsTest : public ::testing::Test {
  protected:
-  void SetUp() override { RecordingPresets::Reset(); }
-
-  const RecordingPresets::Call& Pass() {
-    Tarvek::Conf::GetDefaultVideoBitrate(video_);
-    return RecordingPresets::Last();
+  const Call& Pass() {
+    last = Call{};
+    GetDefaultVideoBitrate(video_);
+    return last;
   }
 
   boost::intrusive_ptr<IFormatCodecVideo> video_ = FullVideo();
 };
 
-TEST_F(VideoArgumentsTest, HandsOnTheSettingsUnchanged) {
-  const auto& call = Pass();
-  EXPECT_EQ(call.codecId, "h264");
-  EXPECT_EQ(call.width, 1920);
-  EXPECT_EQ(call.height, 1080);
-  EXPECT_DOUBLE_EQ(call.frameRate, 30000.0 / 1001.0);
-  EXPECT_EQ(call.quality, 23);
+// Width and height are zero-extended, the quality handed on as its low 32 bits, and a frame
+// rate of denominator 0 as 0.
+TEST_F(VideoArgumentsTest, OutOfRangeValuesArriveAsTheInterfaceDefines) {
+  video_->SetQuality((1LL << 32) + 23);
+  video_->InitByPixelAspect(4294967295u, 2147483648u, 1, 1);
+  video_->SetFrameRate(25, 0);
+  EXPECT_EQ(Pass().quality, 23);
+  EXPECT_EQ(last.width, 4294967295LL);
+  EXPECT_EQ(last.height, 2147483648LL);
+  EXPECT_EQ(last.frameRate, 0.0);
 }
 
+// Only the exact, case-sensitive VBR mode passes the quality on; in any other mode the quality
+// is not even read, so it may be absent. The mode itself must be there, even for the default.
 TEST_F(VideoArgumentsTest, QualityCountsOnlyInExactVbrMode) {
   const std::string vbr = IFormatCodec::TAG_BITRATE_MODE_VBR;
   std::string upper = vbr;
@@ -163,56 +201,21 @@ TEST_F(VideoArgumentsTest, QualityCountsOnlyInExactVbrMode) {
     video_->SetBitrateMode(mode);
     EXPECT_EQ(Pass().quality, -1) << "mode \"" << mode << '"';
   }
-}
 
-TEST_F(VideoArgumentsTest, QualityIsNotReadOutsideVbrMode) {
-  Tarvek::Core::Property tree("t");
-  tree.SetChildT<std::string>(IFormatCodec::TAG_CODEC_ID, "h264");
-  tree.SetChildT<std::string>(IFormatCodec::TAG_BITRATE_MODE, "cbr");
-  tree.SetChildT<long long>(IFormatCodecVideo::TAG_WIDTH, 1280);
-  tree.SetChildT<long long>(IFormatCodecVideo::TAG_HEIGHT, 720);
-  tree.SetChildT<long long>(IFormatCodecVideo::TAG_TIMEBASE_N, 60);
-  tree.SetChildT<long long>(IFormatCodecVideo::TAG_TIMEBASE_D, 1);
-  video_->SetProperty(tree);
+  video_->SetProperty(TarvekTest::Without(video_->GetProperty(), IFormatCodec::TAG_QUALITY));
   EXPECT_EQ(Pass().quality, -1);
-}
-
-TEST_F(VideoArgumentsTest, MissingBitrateModeFailsEvenForTheDefault) {
-  // Every setting but the bitrate mode.
-  Tarvek::Core::Property without("t");
-  for (const auto& child : video_->GetProperty().GetChildren()) {
-    if (child.GetName() != IFormatCodec::TAG_BITRATE_MODE) without.SetChild(child.GetName(), child);
-  }
-  video_->SetProperty(without);
-  const auto error =
-      CatchAs<Tarvek::Core::ChildNotFound>([&] { Tarvek::Conf::GetDefaultVideoBitrate(video_); });
-  ASSERT_TRUE(error);
-  EXPECT_EQ(ItemOf<Tarvek::Core::ChildNotFound::ChildNameInfo>(*error),
+  video_->SetProperty(TarvekTest::Without(video_->GetProperty(), IFormatCodec::TAG_BITRATE_MODE));
+  EXPECT_EQ(TarvekTest::MissingKey([&] { GetDefaultVideoBitrate(video_); }),
             IFormatCodec::TAG_BITRATE_MODE);
 }
 
-TEST_F(VideoArgumentsTest, OutOfRangeValuesArriveAsTheInterfaceDefines) {
-  video_->SetQuality((1LL << 32) + 23);  // only the low 32 bits reach the look-up
-  video_->InitByPixelAspect(4294967295u, 2147483648u, 1, 1);
-  video_->SetFrameRate(25, 0);
-  const auto& call = Pass();
-  EXPECT_EQ(call.quality, 23);
-  EXPECT_EQ(call.width, 4294967295LL);
-  EXPECT_EQ(call.height, 2147483648LL);
-  EXPECT_EQ(call.frameRate, 0.0);
-}
-
-TEST(AudioArgumentsTest, HandsOnTheSettingsUnchanged) {
-  RecordingPresets::Reset();
+// The audio functions hand the sample rate on sign-extended (and, as FullAudio has neither,
+// read no bitrate mode or quality).
+TEST(AudioArgumentsTest, NegativeSampleRateArrivesNegative) {
   auto audio = FullAudio();
   audio->SetSampleRate(-44100);
-  audio->SetBitrateMode("not read");  // the audio functions ignore mode and quality
-  EXPECT_EQ(Tarvek::Conf::GetMaxAudioBitrate(audio), RecordingPresets::kMaxAudio);
-  const auto& call = RecordingPresets::Last();
-  EXPECT_EQ(call.codecId, "aac");
-  EXPECT_EQ(call.sampleRate, -44100);
-  EXPECT_EQ(call.layout, Tarvek::Conf::CH_LAYOUT_5POINT1);
-  EXPECT_EQ(call.sampleFormat, AV_SAMPLE_FMT_FLTP);
+  EXPECT_EQ(GetMaxAudioBitrate(audio), 2003);
+  EXPECT_EQ(last.sampleRate, -44100);
 }
 
 }  // namespace
