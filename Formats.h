@@ -30,11 +30,14 @@
 #include "Conf/Interfaces/IFormatFile.h"
 
 #include "Conf/Formats/BitrateCalculator.h"
+#include "Conf/Formats/Diff.h"
 #include "Conf/Formats/FormatBase.h"
 #include "Conf/Formats/FormatCodec.h"
 #include "Conf/Formats/FormatCodecAudio.h"
 #include "Conf/Formats/FormatCodecSubtitle.h"
 #include "Conf/Formats/FormatCodecVideo.h"
+#include "Conf/Formats/JsonForm.h"
+#include "Conf/Formats/Validate.h"
 
 #include <Tarvek/Presets/BitratePresets.h>
 

@@ -5,7 +5,7 @@ include(CMakePackageConfigHelpers)
 set(TARVEK_CMAKE_DIR "${CMAKE_INSTALL_LIBDIR}/cmake/TarvekFormats")
 
 install(TARGETS TarvekAVUtilHeaders TarvekCore TarvekConfInterfaces TarvekMediaWrapper
-                TarvekPresets TarvekFormats
+                TarvekPresets TarvekFormats TarvekInspect
         EXPORT TarvekFormatsTargets
         LIBRARY DESTINATION "${CMAKE_INSTALL_LIBDIR}"
         ARCHIVE DESTINATION "${CMAKE_INSTALL_LIBDIR}"
@@ -34,6 +34,8 @@ install(FILES "${PROJECT_BINARY_DIR}/TarvekFormatsConfig.cmake"
               "${PROJECT_BINARY_DIR}/TarvekFormatsConfigVersion.cmake"
         DESTINATION "${TARVEK_CMAKE_DIR}")
 
+file(RELATIVE_PATH TARVEK_PC_TO_PREFIX "/${CMAKE_INSTALL_LIBDIR}/pkgconfig" "/")
+string(REGEX REPLACE "/$" "" TARVEK_PC_TO_PREFIX "${TARVEK_PC_TO_PREFIX}")
 configure_file("${PROJECT_SOURCE_DIR}/cmake/tarvek-formats.pc.in"
                "${PROJECT_BINARY_DIR}/tarvek-formats.pc" @ONLY)
 install(FILES "${PROJECT_BINARY_DIR}/tarvek-formats.pc"

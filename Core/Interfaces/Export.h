@@ -51,4 +51,12 @@
 #define TARVEK_FORMATS_API TARVEK_DECL_IMPORT
 #endif
 
+// Inspection library: differences, validation and the JSON form of descriptions
+// (Tarvek::Inspect).
+#if defined(TARVEK_INSPECT_BUILDING)
+#define TARVEK_INSPECT_API TARVEK_DECL_EXPORT
+#else
+#define TARVEK_INSPECT_API TARVEK_DECL_IMPORT
+#endif
+
 #endif  // TARVEK_CORE_INTERFACES_EXPORT_H_

@@ -2,11 +2,15 @@
 //   FormatdescCheck json TOOL ARGUMENT...
 //     the --json output of the arguments parses, and agrees with their text output: same kind,
 //     same settings in the same order, same derived values, same bitrates;
+//   FormatdescCheck fromjson TOOL SUBCOMMAND ARGUMENT...
+//     the --json output of SUBCOMMAND ARGUMENT..., stored in a file and read back with
+//     SUBCOMMAND --from-json, gives the same output again, as JSON and as text;
 //   FormatdescCheck readme TOOL README
 //     every console block of the README's formatdesc section ("$ formatdesc ..." then the
 //     output) prints what it shows; with FORMATDESC_UPDATE_EXPECTED set, the blocks are
 //     rewritten with what the tool prints instead.
 // The tool runs through the shell (popen), so README commands are read as a user's shell would.
+#include <unistd.h>
 #include <cmath>
 #include <cstdio>
 #include <cstdlib>
@@ -122,6 +126,23 @@ int CheckJson(const std::string& tool, const std::vector<std::string>& arguments
   return 0;
 }
 
+int CheckFromJson(const std::string& tool, const std::vector<std::string>& arguments) {
+  std::string command = Quote(tool);
+  for (const std::string& argument : arguments) command += ' ' + Quote(argument);
+  const std::string json = Capture(command + " --json");
+  if (json.empty()) return Fail("no --json output");
+  // In the working directory, named by the process so that checks running at once do not meet.
+  const std::string file = "fromjson-" + std::to_string(getpid()) + ".json";
+  std::ofstream(file) << json;
+  const std::string again = Quote(tool) + ' ' + Quote(arguments.front()) + " --from-json " + file;
+  const bool sameJson = Capture(again + " --json") == json;
+  const bool sameText = Capture(again) == Capture(command);
+  std::remove(file.c_str());
+  if (!sameJson) return Fail("--from-json changes the --json output");
+  if (!sameText) return Fail("--from-json changes the text output");
+  return 0;
+}
+
 int CheckReadme(const std::string& tool, const std::string& path) {
   std::ifstream in(path);
   std::string readme((std::istreambuf_iterator<char>(in)), std::istreambuf_iterator<char>());
@@ -165,6 +186,11 @@ int main(int argc, char** argv) {
   if (args.size() >= 3 && args[0] == "json") {
     return CheckJson(args[1], std::vector<std::string>(args.begin() + 2, args.end()));
   }
+  if (args.size() >= 3 && args[0] == "fromjson") {
+    return CheckFromJson(args[1], std::vector<std::string>(args.begin() + 2, args.end()));
+  }
   if (args.size() == 3 && args[0] == "readme") return CheckReadme(args[1], args[2]);
-  return Fail("usage: FormatdescCheck json TOOL ARGUMENT... | readme TOOL README");
+  return Fail(
+      "usage: FormatdescCheck json TOOL ARGUMENT... | fromjson TOOL SUBCOMMAND ARGUMENT... | "
+      "readme TOOL README");
 }

@@ -1,6 +1,10 @@
 // formatdesc's descriptions, built only through the library's public interfaces.
 #include "Describe.h"
 
+#include <boost/exception/get_error_info.hpp>
+#include <cerrno>
+#include <cstdio>
+#include <cstring>
 #include <limits>
 #include <map>
 
@@ -63,10 +67,64 @@ void SetGeometry(IFormatCodecVideo& video, const VideoArgs& args) {
   video.InitByPixelAspect(size.first, size.second, pixel.first, pixel.second);
 }
 
+// The whole file at `path`; a UsageError naming the option and the system's reason otherwise.
+std::string ReadFile(const std::string& option, const std::string& path) {
+  const std::string prefix = option.empty() ? std::string() : option + ": ";
+  std::FILE* file = std::fopen(path.c_str(), "rb");
+  if (file == nullptr) {
+    throw UsageError(prefix + "cannot read '" + path + "': " + std::strerror(errno));
+  }
+  std::string text;
+  char buffer[65536];
+  for (std::size_t n; (n = std::fread(buffer, 1, sizeof buffer, file)) > 0;) text.append(buffer, n);
+  const bool failed = std::ferror(file) != 0;
+  const int error = errno;
+  std::fclose(file);
+  if (failed) throw UsageError(prefix + "cannot read '" + path + "': " + std::strerror(error));
+  return text;
+}
+
+// The --from-json description as the subcommand's kind, or a new one of that kind.
+template <class Kind, class Factory>
+boost::intrusive_ptr<Kind> Start(const CodecArgs& args, const std::string& kind, Factory create) {
+  if (!args.fromJson) return create();
+  return boost::dynamic_pointer_cast<Kind>(
+      RequireKind(LoadDescription("--from-json", *args.fromJson), kind, *args.fromJson));
+}
+
 }  // namespace
 
+boost::intrusive_ptr<IFormatCodec> LoadDescription(const std::string& option,
+                                                   const std::string& path) {
+  const std::string text = ReadFile(option, path);
+  try {
+    return Tarvek::Conf::FromJson(text);
+  } catch (const Tarvek::Conf::JsonFormError& e) {
+    const std::string* what = boost::get_error_info<Tarvek::DescriptionInfo>(e);
+    throw LoadError(path + ": " + (what != nullptr ? *what : std::string("not a description")));
+  }
+}
+
+const boost::intrusive_ptr<IFormatCodec>& RequireKind(
+    const boost::intrusive_ptr<IFormatCodec>& description, const std::string& kind,
+    const std::string& path) {
+  const std::string found = Tarvek::Conf::DescriptionKind(description);
+  if (found != kind) {
+    throw UsageError("--from-json: '" + path + "' holds " + KindPhrase(found) + ", not " +
+                     KindPhrase(kind));
+  }
+  return description;
+}
+
+std::string KindPhrase(const std::string& kind) {
+  if (kind == "audio") return "an audio description";
+  if (kind == "codec") return "a generic codec description";
+  return "a " + kind + " description";
+}
+
 boost::intrusive_ptr<IFormatCodecVideo> BuildVideo(const VideoArgs& args) {
-  auto video = Tarvek::Conf::FormatCodecVideo::Create();
+  auto video =
+      Start<IFormatCodecVideo>(args.codec, "video", &Tarvek::Conf::FormatCodecVideo::Create);
   if (args.codec.codecId) {
     video->SetCodecID(CheckCodecId("--codec-id", *args.codec.codecId,
                                    Tarvek::Conf::GetPresetVideoCodecs(), "video"));
@@ -82,7 +140,8 @@ boost::intrusive_ptr<IFormatCodecVideo> BuildVideo(const VideoArgs& args) {
 }
 
 boost::intrusive_ptr<IFormatCodecAudio> BuildAudio(const AudioArgs& args) {
-  auto audio = Tarvek::Conf::FormatCodecAudio::Create();
+  auto audio =
+      Start<IFormatCodecAudio>(args.codec, "audio", &Tarvek::Conf::FormatCodecAudio::Create);
   if (args.codec.codecId) {
     audio->SetCodecID(CheckCodecId("--codec-id", *args.codec.codecId,
                                    Tarvek::Conf::GetPresetAudioCodecs(), "audio"));
@@ -104,7 +163,8 @@ boost::intrusive_ptr<IFormatCodecAudio> BuildAudio(const AudioArgs& args) {
 }
 
 boost::intrusive_ptr<IFormatCodecSubtitle> BuildSubtitle(const SubtitleArgs& args) {
-  auto subtitle = Tarvek::Conf::FormatCodecSubtitle::Create();
+  auto subtitle = Start<IFormatCodecSubtitle>(args.codec, "subtitle",
+                                              &Tarvek::Conf::FormatCodecSubtitle::Create);
   // The presets know no subtitle codecs, so any identifier is taken.
   if (args.codec.codecId) subtitle->SetCodecID(*args.codec.codecId);
   SetCodecSettings(*subtitle, args.codec);

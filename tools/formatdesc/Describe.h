@@ -6,6 +6,7 @@
 #include <Tarvek/Formats.h>
 
 #include <optional>
+#include <stdexcept>
 #include <string>
 #include <vector>
 
@@ -16,6 +17,7 @@ namespace Formatdesc {
 /// Values of the settings every codec description has; an empty optional is an option not given.
 /// Texts are read (and refused with a UsageError) only when the description is built.
 struct CodecArgs {
+  std::optional<std::string> fromJson;  // a file holding the description to start from
   std::optional<std::string> codecId;
   std::optional<std::string> codecName;
   std::optional<std::string> tag;
@@ -59,12 +61,36 @@ struct SubtitleArgs {
 };
 
 /// @name Builders
-/// A new description holding every given setting. Throw UsageError for a value that cannot be
-/// read, or a codec identifier the presets do not know for video or audio; nothing else is
-/// checked, so a description may lack settings (its bitrates then fail, see below).
+/// A new description holding every given setting, on top of the description read from
+/// --from-json when one is given. Throw UsageError for a value that cannot be read, a file that
+/// cannot be read or holds another kind, or a codec identifier the presets do not know for video
+/// or audio; LoadError for a file that is not a description; nothing else is checked, so a
+/// description may lack settings (its bitrates then fail, see below).
 boost::intrusive_ptr<Tarvek::Conf::IFormatCodecVideo> BuildVideo(const VideoArgs& args);
 boost::intrusive_ptr<Tarvek::Conf::IFormatCodecAudio> BuildAudio(const AudioArgs& args);
 boost::intrusive_ptr<Tarvek::Conf::IFormatCodecSubtitle> BuildSubtitle(const SubtitleArgs& args);
+
+/// A file that is not a description in the JSON form; what() names the file, where in it and
+/// what is wrong.
+class LoadError : public std::runtime_error {
+ public:
+  using std::runtime_error::runtime_error;
+};
+
+/// The description in the file at `path`, read with the library's FromJson (formatdesc --json
+/// writes such files). Throws UsageError naming `option` (when not empty) for a file that
+/// cannot be read, LoadError for one that holds no description.
+boost::intrusive_ptr<Tarvek::Conf::IFormatCodec> LoadDescription(const std::string& option,
+                                                                 const std::string& path);
+
+/// `description` when it is of `kind` ("video", "audio", "subtitle"); otherwise a UsageError
+/// saying that the --from-json file at `path` holds another kind.
+const boost::intrusive_ptr<Tarvek::Conf::IFormatCodec>& RequireKind(
+    const boost::intrusive_ptr<Tarvek::Conf::IFormatCodec>& description, const std::string& kind,
+    const std::string& path);
+
+/// "a video description", "an audio description", "a generic codec description".
+std::string KindPhrase(const std::string& kind);
 
 /// Default, minimum and maximum bitrate in bits per second.
 struct Bitrates {

@@ -1,6 +1,7 @@
 // formatdesc's output. Text goes to standard output because PrintContent writes there.
 #include "Output.h"
 
+#include <algorithm>
 #include <bitset>
 #include <cstdio>
 #include <iomanip>
@@ -107,19 +108,6 @@ std::vector<std::pair<std::string, std::string>> SummaryLines(
   return lines;
 }
 
-std::string KindName(int codecType) {
-  switch (codecType) {
-    case 0:
-      return "video";
-    case 1:
-      return "audio";
-    case 3:
-      return "subtitle";
-    default:
-      return "codec";
-  }
-}
-
 // A property tree as JSON: containers as objects (the first child of a repeated name wins, as in
 // the library's look-ups), leaves as their values.
 nlohmann::ordered_json TreeJson(const Tarvek::Core::Property& node) {
@@ -142,6 +130,50 @@ nlohmann::ordered_json TreeJson(const Tarvek::Core::Property& node) {
 
 nlohmann::ordered_json BitratesJson(const Bitrates& bitrates) {
   return {{"default", bitrates.typical}, {"min", bitrates.minimum}, {"max", bitrates.maximum}};
+}
+
+std::string Dump(const nlohmann::ordered_json& value) {
+  return value.dump(-1, ' ', false, nlohmann::ordered_json::error_handler_t::replace);
+}
+
+// `value` on one line, with ", " and ": " between items.
+std::string OneLine(const nlohmann::ordered_json& value) {
+  if (!value.is_structured() || value.empty()) return Dump(value);
+  std::string line(1, value.is_object() ? '{' : '[');
+  bool first = true;
+  for (const auto& item : value.items()) {
+    if (!first) line += ", ";
+    first = false;
+    if (value.is_object()) line += Dump(item.key()) + ": ";
+    line += OneLine(item.value());
+  }
+  return line + (value.is_object() ? '}' : ']');
+}
+
+// The layout of the library's JSON form, so that the tool's output reads like a stored file:
+// indented by two, objects and arrays of plain values on one line when it stays within 100
+// columns.
+void WriteJson(const nlohmann::ordered_json& value, std::size_t indent, std::size_t column,
+               std::string& out) {
+  const bool plain = std::none_of(value.begin(), value.end(), [](const auto& element) {
+    return element.is_structured() && !element.empty();
+  });
+  const std::string line = plain ? OneLine(value) : std::string();
+  if (!value.is_structured() || value.empty() || (plain && column + line.size() <= 100)) {
+    out += line;
+    return;
+  }
+  const std::string pad(indent + 2, ' ');
+  out += value.is_object() ? "{\n" : "[\n";
+  bool first = true;
+  for (const auto& item : value.items()) {
+    out += first ? pad : ",\n" + pad;
+    first = false;
+    const std::string key = value.is_object() ? Dump(item.key()) + ": " : std::string();
+    out += key;
+    WriteJson(item.value(), indent + 2, pad.size() + key.size(), out);
+  }
+  out += "\n" + std::string(indent, ' ') + (value.is_object() ? '}' : ']');
 }
 
 // Table cells joined by two spaces, each padded to its column's width: left-aligned columns
@@ -211,7 +243,12 @@ std::string ReadableFrameRate(double framesPerSecond) {
 
 void PrintDescription(IFormatCodec& codec, const std::optional<Bitrates>& bitrates) {
   codec.PrintContent();
-  const auto lines = SummaryLines(Derive(codec), bitrates);
+  auto lines = SummaryLines(Derive(codec), bitrates);
+  // Kept outside the tree, so PrintContent does not show it.
+  if (const auto data = codec.GetPrivateData()) {
+    const std::size_t size = data->GetSize();
+    lines.emplace_back("Private data", std::to_string(size) + (size == 1 ? " byte" : " bytes"));
+  }
   if (lines.empty()) return;
   std::cout << "======Summary:=============\n";
   for (const auto& [label, value] : lines) {
@@ -219,11 +256,11 @@ void PrintDescription(IFormatCodec& codec, const std::optional<Bitrates>& bitrat
   }
 }
 
-nlohmann::ordered_json DescriptionJson(const IFormatCodec& codec,
+nlohmann::ordered_json DescriptionJson(const boost::intrusive_ptr<IFormatCodec>& codec,
                                        const std::optional<Bitrates>& bitrates) {
-  nlohmann::ordered_json json = {{"kind", KindName(codec.GetCodecType())},
-                                 {"settings", TreeJson(codec.GetProperty())}};
-  const Derived derived = Derive(codec);
+  nlohmann::ordered_json json = nlohmann::ordered_json::parse(Tarvek::Conf::ToJson(codec));
+  json["settings"] = TreeJson(codec->GetProperty());
+  const Derived derived = Derive(*codec);
   if (derived.frameAspect) json["frame_aspect"] = RatioText(*derived.frameAspect, ':');
   if (derived.frameRate) {
     const Pair rate = *derived.frameRate;
@@ -286,8 +323,69 @@ nlohmann::ordered_json CodecsJson(const std::optional<std::string>& kind) {
   return json;
 }
 
+void PrintDiff(std::ostream& out, const std::vector<Tarvek::Conf::Difference>& differences,
+               const std::vector<Tarvek::Conf::Incompatibility>& reasons) {
+  using Tarvek::Conf::DifferenceKind;
+  out << (differences.empty() ? "Differences: none\n" : "Differences:\n");
+  for (const auto& d : differences) {
+    out << "  " << (d.path.empty() ? "(root)" : d.path) << ": "
+        << Tarvek::Conf::DifferenceKindName(d.kind) << ": ";
+    if (d.kind == DifferenceKind::OnlyInA) {
+      out << d.a << '\n';
+    } else if (d.kind == DifferenceKind::OnlyInB) {
+      out << d.b << '\n';
+    } else {
+      out << d.a << " in a, " << d.b << " in b\n";
+    }
+  }
+  out << "Compatibility: b " << (reasons.empty() ? "can" : "cannot")
+      << " be used where a is expected\n";
+  for (const auto& reason : reasons) out << "  " << reason.reason << '\n';
+}
+
+nlohmann::ordered_json DiffJson(const std::vector<Tarvek::Conf::Difference>& differences,
+                                const std::vector<Tarvek::Conf::Incompatibility>& reasons) {
+  nlohmann::ordered_json json = {{"equal", differences.empty()},
+                                 {"differences", nlohmann::ordered_json::array()},
+                                 {"compatible", reasons.empty()},
+                                 {"reasons", nlohmann::ordered_json::array()}};
+  for (const auto& d : differences) {
+    json["differences"].push_back({{"path", d.path},
+                                   {"kind", Tarvek::Conf::DifferenceKindName(d.kind)},
+                                   {"a", d.a},
+                                   {"b", d.b}});
+  }
+  for (const auto& r : reasons) {
+    json["reasons"].push_back(
+        {{"setting", r.setting}, {"a", r.a}, {"b", r.b}, {"reason", r.reason}});
+  }
+  return json;
+}
+
+void PrintFindings(std::ostream& out, const std::vector<Tarvek::Conf::Finding>& findings) {
+  if (findings.empty()) out << "valid\n";
+  for (const auto& finding : findings) {
+    out << Tarvek::Conf::SeverityName(finding.severity) << ": "
+        << (finding.setting.empty() ? std::string() : finding.setting + ": ") << finding.message
+        << '\n';
+  }
+}
+
+nlohmann::ordered_json FindingsJson(const std::vector<Tarvek::Conf::Finding>& findings) {
+  nlohmann::ordered_json json = {{"valid", true}, {"findings", nlohmann::ordered_json::array()}};
+  for (const auto& finding : findings) {
+    if (finding.severity == Tarvek::Conf::Severity::Error) json["valid"] = false;
+    json["findings"].push_back({{"severity", Tarvek::Conf::SeverityName(finding.severity)},
+                                {"setting", finding.setting},
+                                {"message", finding.message}});
+  }
+  return json;
+}
+
 void PrintJson(std::ostream& out, const nlohmann::ordered_json& value) {
-  out << value.dump(2, ' ', false, nlohmann::ordered_json::error_handler_t::replace) << '\n';
+  std::string text;
+  WriteJson(value, 0, 0, text);
+  out << text << '\n';
 }
 
 }  // namespace Formatdesc

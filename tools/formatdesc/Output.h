@@ -23,14 +23,29 @@ std::string DescribeBitrate(long long bitsPerSecond);
 std::string ReadableFrameRate(double framesPerSecond);
 
 /// Prints `codec`'s PrintContent to standard output, then under "======Summary:=============" the
-/// derived values that are set (frame aspect and rate, format and layout names) and the
-/// bitrates when given, one "Label: value" line each.
+/// derived values that are set (frame aspect and rate, format and layout names, the size of the
+/// private data) and the bitrates when given, one "Label: value" line each.
 void PrintDescription(Tarvek::Conf::IFormatCodec& codec, const std::optional<Bitrates>& bitrates);
 
-/// The same as one JSON object: "kind", "settings" (the property tree under the description's
-/// own keys), the derived values, and "bitrate" {"default", "min", "max"} when given.
-nlohmann::ordered_json DescriptionJson(const Tarvek::Conf::IFormatCodec& codec,
-                                       const std::optional<Bitrates>& bitrates);
+/// The same as one JSON object: the library's JSON form of the description (ToJson, which
+/// --from-json reads back), then "settings" (the property tree under the description's own
+/// keys, the first child of a repeated name), the derived values, and "bitrate" {"default",
+/// "min", "max"} when given.
+nlohmann::ordered_json DescriptionJson(
+    const boost::intrusive_ptr<Tarvek::Conf::IFormatCodec>& codec,
+    const std::optional<Bitrates>& bitrates);
+
+/// The differences between descriptions a and b, one line each under "Differences:" (or
+/// "Differences: none"), then whether b can be used where a is expected and, if not, why.
+void PrintDiff(std::ostream& out, const std::vector<Tarvek::Conf::Difference>& differences,
+               const std::vector<Tarvek::Conf::Incompatibility>& reasons);
+nlohmann::ordered_json DiffJson(const std::vector<Tarvek::Conf::Difference>& differences,
+                                const std::vector<Tarvek::Conf::Incompatibility>& reasons);
+
+/// Validate's findings, one "severity: setting: message" line each, or "valid" when there are
+/// none; as JSON, {"valid": no error found, "findings": [...]}.
+void PrintFindings(std::ostream& out, const std::vector<Tarvek::Conf::Finding>& findings);
+nlohmann::ordered_json FindingsJson(const std::vector<Tarvek::Conf::Finding>& findings);
 
 /// The ladder as an aligned table under a title line naming codec, frame rate and quality.
 void PrintLadder(std::ostream& out, const std::string& codecId, Pair frameRate,
@@ -44,7 +59,9 @@ nlohmann::ordered_json LadderJson(const std::string& codecId, Pair frameRate,
 void PrintCodecs(std::ostream& out, const std::optional<std::string>& kind);
 nlohmann::ordered_json CodecsJson(const std::optional<std::string>& kind);
 
-/// Writes `value` indented by two, with invalid UTF-8 in strings replaced rather than refused.
+/// Writes `value` indented by two, an object or array of plain values on one line when it fits in
+/// 100 columns (as the library writes its JSON form), with invalid UTF-8 in strings replaced
+/// rather than refused.
 void PrintJson(std::ostream& out, const nlohmann::ordered_json& value);
 
 }  // namespace Formatdesc

@@ -1,8 +1,10 @@
-// formatdesc: builds a format description from command-line options and shows it, with the
-// bitrates the presets give for it. This file wires the subcommands and their options and turns
-// every failure into one line on standard error and an exit status:
-//   0 success, 1 the library refused (for example a setting the bitrates need is missing),
-//   2 bad usage (an unknown option, a value that cannot be read).
+// formatdesc: builds a format description from command-line options (or a stored one) and shows
+// it, with the bitrates the presets give for it; compares and validates stored descriptions.
+// This file wires the subcommands and their options and turns every failure into one line on
+// standard error and an exit status:
+//   0 success, 1 the library refused (for example a setting the bitrates need is missing, or a
+//   file holds no description) or validate found an error, 2 bad usage (an unknown option, a
+//   value or file that cannot be read).
 #include <Tarvek/Formats.h>
 #include <CLI/CLI.hpp>
 
@@ -33,11 +35,26 @@ struct ShowFlags {
 };
 
 struct LadderArgs {
-  std::string codecId;
-  std::string frameRate = "30";
+  std::optional<std::string> codecId;
+  std::optional<std::string> frameRate;
   std::optional<std::string> quality;
+  std::optional<std::string> fromJson;
   bool json = false;
 };
+
+struct DiffArgs {
+  std::string a;
+  std::string b;
+  bool json = false;
+};
+
+struct ValidateArgs {
+  std::string file;
+  bool json = false;
+};
+
+constexpr const char* kFromJsonHelp =
+    "Start from the description in FILE (as --json writes it); the options change it";
 
 struct CodecsArgs {
   std::optional<std::string> kind;
@@ -62,6 +79,7 @@ void AddSwitch(CLI::App& app, const std::string& name, std::optional<bool>& valu
 }
 
 void AddCodecOptions(CLI::App& app, CodecArgs& args, const std::string& idHelp) {
+  AddText(app, "--from-json", args.fromJson, kFromJsonHelp, "FILE");
   const std::string group = "Codec settings";
   AddText(app, "--codec-id", args.codecId, idHelp, "ID")->group(group);
   AddText(app, "--codec-name", args.codecName, "Codec name (free text)")->group(group);
@@ -165,17 +183,16 @@ void AddSubtitle(CLI::App& app, SubtitleArgs& args, ShowFlags& flags) {
 void AddLadder(CLI::App& app, LadderArgs& args) {
   CLI::App* ladder =
       app.add_subcommand("ladder", "Default, minimum and maximum bitrates from 240p to 2160p");
-  ladder->add_option("codec-id", args.codecId, "Video codec identifier known to the presets")
-      ->required()
-      ->type_name("ID");
-  ladder->add_option("--frame-rate", args.frameRate, "Frame rate: 30000/1001, 25 or 29.97")
-      ->type_name("RATE")
-      ->capture_default_str();
+  AddText(*ladder, "codec-id", args.codecId, "Video codec identifier known to the presets", "ID");
+  AddText(*ladder, "--frame-rate", args.frameRate,
+          "Frame rate: 30000/1001, 25 or 29.97 (30 when not given)", "RATE");
   AddText(*ladder, "--quality", args.quality, "Encoder quality figure (vbr mode)", "N");
+  AddText(*ladder, "--from-json", args.fromJson,
+          "Take codec, frame rate and vbr quality from the video description in FILE", "FILE");
   ladder->add_flag("--json", args.json, "Print one JSON object instead of the table");
   ladder->footer(
       "Each size has square pixels; with --quality the bitrates are those of vbr mode at that\n"
-      "quality.\n" +
+      "quality. The codec-id, --frame-rate and --quality given win over those of --from-json.\n" +
       std::string(kExitStatus));
 }
 
@@ -186,11 +203,43 @@ void AddCodecs(CLI::App& app, CodecsArgs& args) {
   codecs->footer(kExitStatus);
 }
 
-void Show(Tarvek::Conf::IFormatCodec& codec, const std::optional<Bitrates>& bitrates, bool json) {
+void AddDiff(CLI::App& app, DiffArgs& args) {
+  CLI::App* diff = app.add_subcommand("diff", "Compare two stored descriptions, with reasons");
+  diff->add_option("a", args.a, "The description expected (as --json writes it)")
+      ->required()
+      ->type_name("A.json");
+  diff->add_option("b", args.b, "The description compared with it")
+      ->required()
+      ->type_name("B.json");
+  diff->add_flag("--json", args.json, "Print one JSON object instead of text");
+  diff->footer(
+      "Lists every setting that differs (only in a, only in b, other type, other value, other\n"
+      "order), then whether a stream described by b can be used where a is expected (video:\n"
+      "size and pixel aspect; audio: sample rate, layout and sample format) and why not.\n"
+      "Exit status: 0 whether or not they differ, 1 when a file holds no description, 2 for bad\n"
+      "usage or a file that cannot be read.");
+}
+
+void AddValidate(CLI::App& app, ValidateArgs& args) {
+  CLI::App* validate = app.add_subcommand("validate", "Check a stored description");
+  validate->add_option("file", args.file, "The description (as --json writes it)")
+      ->required()
+      ->type_name("FILE.json");
+  validate->add_flag("--json", args.json, "Print one JSON object instead of text");
+  validate->footer(
+      "Prints one line a finding (error or warning) naming the setting, or 'valid'. Errors are\n"
+      "what a getter, the bitrates or the compatibility test would fail on; warnings, such as a\n"
+      "bitrate outside the presets' range, are usable but probably not meant.\n"
+      "Exit status: 0 when no error is found, 1 when one is or the file holds no description, 2\n"
+      "for bad usage or a file that cannot be read.");
+}
+
+void Show(const boost::intrusive_ptr<Tarvek::Conf::IFormatCodec>& codec,
+          const std::optional<Bitrates>& bitrates, bool json) {
   if (json) {
     PrintJson(std::cout, DescriptionJson(codec, bitrates));
   } else {
-    PrintDescription(codec, bitrates);
+    PrintDescription(*codec, bitrates);
   }
 }
 
@@ -198,21 +247,51 @@ void RunVideo(const VideoArgs& args, const ShowFlags& flags) {
   const auto video = BuildVideo(args);
   std::optional<Bitrates> bitrates;
   if (!flags.noBitrate) bitrates = VideoBitrates(video);
-  Show(*video, bitrates, flags.json);
+  Show(video, bitrates, flags.json);
 }
 
 void RunAudio(const AudioArgs& args, const ShowFlags& flags) {
   const auto audio = BuildAudio(args);
   std::optional<Bitrates> bitrates;
   if (!flags.noBitrate) bitrates = AudioBitrates(audio);
-  Show(*audio, bitrates, flags.json);
+  Show(audio, bitrates, flags.json);
+}
+
+// What the ladder takes from a stored video description: its codec, its frame rate when it has
+// one, and its quality in vbr mode.
+void LadderFromJson(const std::string& path, std::optional<std::string>& codecId,
+                    std::optional<Pair>& rate, std::optional<long long>& quality) {
+  const auto loaded = LoadDescription("--from-json", path);
+  const auto video = boost::dynamic_pointer_cast<Tarvek::Conf::IFormatCodecVideo>(
+      RequireKind(loaded, "video", path));
+  if (video->ExistsCodecID()) codecId = video->GetCodecID();
+  if (video->ExistsFrameRateNum() && video->ExistsFrameRateDen() && video->GetFrameRateNum() != 0 &&
+      video->GetFrameRateDen() != 0) {
+    rate = Pair{video->GetFrameRateNum(), video->GetFrameRateDen()};
+  }
+  if (video->ExistsBitrateMode() &&
+      video->GetBitrateMode() == Tarvek::Conf::IFormatCodec::TAG_BITRATE_MODE_VBR &&
+      video->ExistsQuality()) {
+    quality = video->GetQuality();
+  }
 }
 
 void RunLadder(const LadderArgs& args) {
-  const std::string codecId =
-      CheckCodecId("codec-id", args.codecId, Tarvek::Conf::GetPresetVideoCodecs(), "video");
-  const Pair rate = ParseFrameRate("--frame-rate", args.frameRate);
+  std::optional<std::string> fileCodecId;
+  std::optional<Pair> fileRate;
   std::optional<long long> quality;
+  if (args.fromJson) LadderFromJson(*args.fromJson, fileCodecId, fileRate, quality);
+  const std::optional<std::string> given = args.codecId ? args.codecId : fileCodecId;
+  if (!given) {
+    throw UsageError(args.fromJson
+                         ? "codec-id: not given, and '" + *args.fromJson + "' holds no codec_id"
+                         : std::string("codec-id is required (or --from-json)"));
+  }
+  const std::string codecId =
+      CheckCodecId("codec-id", *given, Tarvek::Conf::GetPresetVideoCodecs(), "video");
+  const Pair rate = args.frameRate || !fileRate
+                        ? ParseFrameRate("--frame-rate", args.frameRate.value_or("30"))
+                        : *fileRate;
   if (args.quality) {
     quality = ParseNonNegative("--quality", *args.quality, std::numeric_limits<int>::max());
   }
@@ -222,6 +301,31 @@ void RunLadder(const LadderArgs& args) {
   } else {
     PrintLadder(std::cout, codecId, rate, quality, rows);
   }
+}
+
+void RunDiff(const DiffArgs& args) {
+  const auto a = LoadDescription("", args.a);
+  const auto b = LoadDescription("", args.b);
+  const auto differences = Tarvek::Conf::Diff(a, b);
+  const auto reasons = Tarvek::Conf::ExplainCompatibility(a, b);
+  if (args.json) {
+    PrintJson(std::cout, DiffJson(differences, reasons));
+  } else {
+    PrintDiff(std::cout, differences, reasons);
+  }
+}
+
+// True when an error was found.
+bool RunValidate(const ValidateArgs& args) {
+  const auto findings = Tarvek::Conf::Validate(LoadDescription("", args.file));
+  if (args.json) {
+    PrintJson(std::cout, FindingsJson(findings));
+  } else {
+    PrintFindings(std::cout, findings);
+  }
+  return std::any_of(findings.begin(), findings.end(), [](const Tarvek::Conf::Finding& f) {
+    return f.severity == Tarvek::Conf::Severity::Error;
+  });
 }
 
 void RunCodecs(const CodecsArgs& args) {
@@ -289,7 +393,7 @@ std::string ExtrasMessage(const CLI::App& app) {
 // switch given a value, an unknown or missing subcommand.
 std::string ParseErrorMessage(const CLI::App& app, const CLI::ParseError& e, int argc,
                               char** argv) {
-  const std::string known = "video, audio, subtitle, ladder or codecs";
+  const std::string known = "video, audio, subtitle, ladder, codecs, diff or validate";
   if (std::string(e.what()).find("disallowed flag override") != std::string::npos) {
     return SwitchValueMessage(argc, argv);
   }
@@ -305,22 +409,31 @@ std::string ParseErrorMessage(const CLI::App& app, const CLI::ParseError& e, int
 }
 
 int Run(int argc, char** argv) {
-  CLI::App app("Builds a media format description from options and shows it.", "formatdesc");
+  CLI::App app(
+      "Builds a media format description from options and shows it; compares and checks stored "
+      "ones.",
+      "formatdesc");
   app.set_version_flag("--version", std::string("formatdesc ") + TARVEK_FORMATS_VERSION);
   app.require_subcommand(1);
-  app.footer("Run 'formatdesc SUBCOMMAND --help' for the options of each.\n" +
-             std::string(kExitStatus));
+  app.footer(
+      "Run 'formatdesc SUBCOMMAND --help' for the options of each.\n"
+      "Exit status: 0 on success, 1 when the library refuses the description or validate finds "
+      "an\nerror, 2 for bad usage.");
   VideoArgs video;
   AudioArgs audio;
   SubtitleArgs subtitle;
   ShowFlags videoFlags, audioFlags, subtitleFlags;
   LadderArgs ladder;
   CodecsArgs codecs;
+  DiffArgs diff;
+  ValidateArgs validate;
   AddVideo(app, video, videoFlags);
   AddAudio(app, audio, audioFlags);
   AddSubtitle(app, subtitle, subtitleFlags);
   AddLadder(app, ladder);
   AddCodecs(app, codecs);
+  AddDiff(app, diff);
+  AddValidate(app, validate);
   try {
     app.parse(argc, argv);
   } catch (const CLI::ParseError& e) {
@@ -333,14 +446,13 @@ int Run(int argc, char** argv) {
   const std::string name = app.get_subcommands().front()->get_name();
   if (name == "video") RunVideo(video, videoFlags);
   if (name == "audio") RunAudio(audio, audioFlags);
-  if (name == "subtitle") {
-    const auto description = BuildSubtitle(subtitle);
-    Show(*description, std::nullopt, subtitleFlags.json);
-  }
+  if (name == "subtitle") Show(BuildSubtitle(subtitle), std::nullopt, subtitleFlags.json);
   if (name == "ladder") RunLadder(ladder);
   if (name == "codecs") RunCodecs(codecs);
+  if (name == "diff") RunDiff(diff);
+  const bool invalid = name == "validate" && RunValidate(validate);
   if (!std::cout.flush()) return Fail("cannot write to standard output", kLibraryError);
-  return 0;
+  return invalid ? kLibraryError : 0;
 }
 
 }  // namespace

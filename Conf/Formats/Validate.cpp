@@ -1,0 +1,303 @@
+#include "Validate.h"
+
+#include <algorithm>
+#include <boost/exception/get_error_info.hpp>
+#include <cctype>
+#include <cstdint>
+#include <limits>
+
+#include <Tarvek/Presets/BitratePresets.h>
+#include "../Interfaces/AVUtilTypes.h"
+#include "../Interfaces/IFormatCodecAudio.h"
+#include "../Interfaces/IFormatCodecSubtitle.h"
+#include "../Interfaces/IFormatCodecVideo.h"
+#include "../Interfaces/IFormatFile.h"
+#include "BitrateCalculator.h"
+#include "Diff.h"
+#include "JsonForm.h"
+
+namespace Tarvek {
+namespace Conf {
+namespace {
+
+using Video = IFormatCodecVideo;
+using Audio = IFormatCodecAudio;
+using Subtitle = IFormatCodecSubtitle;
+
+// The range of the integer an accessor makes of a stored int64.
+enum class Range { Int64, Unsigned32, Signed32 };
+
+// A key the description's kind knows, with the type and range its accessors read. `parent` is
+// "" for a child of the root, or the container it lives in (the audio language lives in the
+// metadata).
+struct Known {
+  std::string parent;
+  std::string key;
+  PropertyTypes type;
+  Range range;
+};
+
+std::vector<Known> KnownKeys(const std::string& kind) {
+  std::vector<Known> keys = {{"", IFormat::TAG_METADATA, PropertyTypeContainer, Range::Int64}};
+  if (kind.empty()) return keys;
+  const std::vector<Known> codec = {
+      {"", IFormatCodec::TAG_NAME, PropertyTypeString, Range::Int64},
+      {"", IFormatCodec::TAG_CODEC_ID, PropertyTypeString, Range::Int64},
+      {"", IFormatCodec::TAG_FOURCC, PropertyTypeInt64, Range::Int64},
+      {"", IFormatCodec::TAG_BITRATE_MODE, PropertyTypeString, Range::Int64},
+      {"", IFormatCodec::TAG_BITRATE, PropertyTypeInt64, Range::Int64},
+      {"", IFormatCodec::TAG_QUALITY, PropertyTypeInt64, Range::Int64},
+      {"", IFormatCodec::TAG_LOSSLESS, PropertyTypeBool, Range::Int64},
+      {"", IFormatCodec::TAG_THREAD_NUMBER, PropertyTypeInt64, Range::Unsigned32},
+      {"", IFormatCodec::TAG_TWO_PASS_ENCODING, PropertyTypeBool, Range::Int64},
+      {"", IFormatCodec::TAG_GLOBAL_HEADER, PropertyTypeBool, Range::Int64},
+      {"", IFormatCodec::TAG_MAIN_STREAM, PropertyTypeBool, Range::Int64},
+      {"", IFormatCodec::TAG_CODEC_OPTIONS_ENCODE, PropertyTypeContainer, Range::Int64},
+      {"", IFormatCodec::TAG_CODEC_OPTIONS_ANALYZE, PropertyTypeContainer, Range::Int64},
+  };
+  keys.insert(keys.end(), codec.begin(), codec.end());
+  std::vector<Known> own;
+  // Pixel and sample formats are checked against libavutil's enumeration instead of a range.
+  if (kind == "video") {
+    own = {{"", Video::TAG_WIDTH, PropertyTypeInt64, Range::Unsigned32},
+           {"", Video::TAG_HEIGHT, PropertyTypeInt64, Range::Unsigned32},
+           {"", Video::TAG_ASPECTX, PropertyTypeInt64, Range::Unsigned32},
+           {"", Video::TAG_ASPECTY, PropertyTypeInt64, Range::Unsigned32},
+           {"", Video::TAG_TIMEBASE_N, PropertyTypeInt64, Range::Unsigned32},
+           {"", Video::TAG_TIMEBASE_D, PropertyTypeInt64, Range::Unsigned32},
+           {"", Video::TAG_PIX_FMT, PropertyTypeInt64, Range::Int64}};
+  } else if (kind == "audio") {
+    own = {{IFormat::TAG_METADATA, IFormatCodec::TAG_LANGUAGE, PropertyTypeString, Range::Int64},
+           {"", Audio::TAG_SAMPLE_RATE, PropertyTypeInt64, Range::Signed32},
+           {"", Audio::TAG_LAYOUT, PropertyTypeInt64, Range::Unsigned32},
+           {"", Audio::TAG_FRAME_SIZE, PropertyTypeInt64, Range::Signed32},
+           {"", Audio::TAG_SAMPLE_FORMAT, PropertyTypeInt64, Range::Int64}};
+  } else if (kind == "subtitle") {
+    own = {{"", IFormatCodec::TAG_LANGUAGE, PropertyTypeString, Range::Int64},
+           {"", IFormatFile::TAG_TITLE, PropertyTypeString, Range::Int64},
+           {"", Subtitle::TAG_SUBTITLE_AUTHOR, PropertyTypeString, Range::Int64},
+           {"", Subtitle::TAG_SUBTITLE_HEADER, PropertyTypeString, Range::Int64},
+           {"", Subtitle::TAG_DVB_WIDTH, PropertyTypeInt64, Range::Unsigned32},
+           {"", Subtitle::TAG_DVB_HEIGHT, PropertyTypeInt64, Range::Unsigned32}};
+  }
+  keys.insert(keys.end(), own.begin(), own.end());
+  return keys;
+}
+
+// The settings under review, read without a getter, so that nothing the tree holds can throw.
+class Review {
+ public:
+  Review(const Core::Property& tree, std::vector<Finding>& findings)
+      : tree_(tree), findings_(findings) {}
+
+  // The first child `key` of `parent` ("" for the root), as the getters find it; null when the
+  // child or its container is missing, or the container is a leaf.
+  const Core::Property* Find(const std::string& parent, const std::string& key) const {
+    const Core::Property* container = &tree_;
+    if (!parent.empty()) {
+      const auto found = tree_.FindChild(parent);
+      if (found == tree_.GetChildren().end()) return nullptr;
+      container = &*found;
+    }
+    if (container->GetType() != PropertyTypeContainer) return nullptr;
+    const auto found = container->FindChild(key);
+    return found == container->GetChildren().end() ? nullptr : &*found;
+  }
+
+  // The root child `key` when it holds an int64, else null.
+  const Core::Property* Integer(const std::string& key) const {
+    const Core::Property* node = Find("", key);
+    return node != nullptr && node->GetType() == PropertyTypeInt64 ? node : nullptr;
+  }
+
+  void Add(Severity severity, const std::string& setting, const std::string& message) {
+    findings_.push_back({severity, setting, message});
+  }
+
+  bool HasError() const {
+    return std::any_of(findings_.begin(), findings_.end(),
+                       [](const Finding& f) { return f.severity == Severity::Error; });
+  }
+
+ private:
+  const Core::Property& tree_;
+  std::vector<Finding>& findings_;
+};
+
+std::string PathOf(const Known& known) {
+  return known.parent.empty() ? known.key : known.parent + "/" + known.key;
+}
+
+void CheckTypesAndRanges(Review& review, const std::vector<Known>& keys) {
+  for (const Known& known : keys) {
+    const Core::Property* node = review.Find(known.parent, known.key);
+    if (node == nullptr) continue;
+    const std::string path = PathOf(known);
+    if (node->GetType() != known.type) {
+      review.Add(Severity::Error, path,
+                 path + " holds " + ValueText(*node) + ", but its accessors read " +
+                     (known.type == PropertyTypeInt64 ? "an " : "a ") +
+                     PropertyTypeName(known.type));
+      continue;
+    }
+    if (known.range == Range::Int64) continue;
+    const long long value = node->GetInt64();
+    const bool isUnsigned = known.range == Range::Unsigned32;
+    const long long low = isUnsigned ? 0 : std::numeric_limits<std::int32_t>::min();
+    const long long high = isUnsigned ? std::numeric_limits<std::uint32_t>::max()
+                                      : std::numeric_limits<std::int32_t>::max();
+    if (value < low || value > high) {
+      const long long read = isUnsigned ? static_cast<long long>(static_cast<std::uint32_t>(value))
+                                        : static_cast<long long>(static_cast<std::int32_t>(value));
+      review.Add(Severity::Error, path,
+                 path + " holds " + std::to_string(value) + ", beyond the range " +
+                     std::to_string(low) + " to " + std::to_string(high) +
+                     " its accessor reads (it reads " + std::to_string(read) + ")");
+    }
+  }
+}
+
+void CheckPresent(Review& review, const std::vector<std::string>& keys, Severity severity,
+                  const std::string& why) {
+  for (const std::string& key : keys) {
+    if (review.Find("", key) == nullptr) review.Add(severity, key, key + " is missing; " + why);
+  }
+}
+
+// A setting that must not be 0, when it holds an int64 in range (else it was reported above).
+void CheckNotZero(Review& review, const std::string& key, const std::string& sentence) {
+  const Core::Property* node = review.Integer(key);
+  if (node != nullptr && node->GetInt64() == 0) review.Add(Severity::Error, key, sentence);
+}
+
+std::string Lower(std::string text) {
+  for (char& c : text) c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
+  return text;
+}
+
+bool Knows(const std::vector<std::string>& ids, const std::string& id) {
+  return std::find(ids.begin(), ids.end(), Lower(id)) != ids.end();
+}
+
+void CheckCodecId(Review& review, const std::string& kind) {
+  const Core::Property* node = review.Find("", IFormatCodec::TAG_CODEC_ID);
+  if (node == nullptr || node->GetType() != PropertyTypeString) return;
+  const std::string& id = node->GetString();
+  const bool video = kind == "video";
+  const auto& own = video ? GetPresetVideoCodecs() : GetPresetAudioCodecs();
+  const auto& other = video ? GetPresetAudioCodecs() : GetPresetVideoCodecs();
+  if (Knows(own, id)) return;
+  const std::string held = "codec_id holds " + ValueText(*node);
+  review.Add(Severity::Error, IFormatCodec::TAG_CODEC_ID,
+             Knows(other, id)
+                 ? held + ", " + (video ? "an audio" : "a video") + " codec; " +
+                       (video ? "a video" : "an audio") + " description needs one of its own kind"
+                 : held + ", which is not " + (video ? "a video" : "an audio") +
+                       " codec the presets know");
+}
+
+void CheckEnumeration(Review& review, const std::string& key, long long count,
+                      const std::string& what) {
+  const Core::Property* node = review.Integer(key);
+  if (node == nullptr) return;
+  const long long value = node->GetInt64();
+  if (value < 0 || value >= count) {
+    review.Add(Severity::Error, key,
+               key + " " + std::to_string(value) + " is not " + what + " libavutil knows");
+  }
+}
+
+void CheckVideo(Review& review) {
+  const std::string bitrates = "the bitrate functions need it";
+  CheckPresent(review,
+               {IFormatCodec::TAG_CODEC_ID, IFormatCodec::TAG_BITRATE_MODE, Video::TAG_WIDTH,
+                Video::TAG_HEIGHT, Video::TAG_TIMEBASE_N, Video::TAG_TIMEBASE_D},
+               Severity::Error, bitrates);
+  const Core::Property* mode = review.Find("", IFormatCodec::TAG_BITRATE_MODE);
+  if (mode != nullptr && mode->GetType() == PropertyTypeString &&
+      mode->GetString() == IFormatCodec::TAG_BITRATE_MODE_VBR) {
+    CheckPresent(review, {IFormatCodec::TAG_QUALITY}, Severity::Error, bitrates + " in vbr mode");
+  }
+  CheckPresent(review, {Video::TAG_ASPECTX, Video::TAG_ASPECTY}, Severity::Warning,
+               "the frame aspect and the compatibility test need it");
+  CheckCodecId(review, "video");
+  CheckNotZero(review, Video::TAG_WIDTH, "the width is 0");
+  CheckNotZero(review, Video::TAG_HEIGHT, "the height is 0");
+  CheckNotZero(review, Video::TAG_ASPECTX, "the pixel aspect X (sample_aspect_num) is 0");
+  CheckNotZero(review, Video::TAG_ASPECTY, "the pixel aspect Y (sample_aspect_den) is 0");
+  CheckNotZero(review, Video::TAG_TIMEBASE_D,
+               "the frame-rate denominator is 0, which leaves the frame rate unknown");
+  CheckEnumeration(review, Video::TAG_PIX_FMT, AV_PIX_FMT_NB, "a pixel format");
+}
+
+void CheckAudio(Review& review) {
+  CheckPresent(review,
+               {IFormatCodec::TAG_CODEC_ID, Audio::TAG_SAMPLE_RATE, Audio::TAG_LAYOUT,
+                Audio::TAG_SAMPLE_FORMAT},
+               Severity::Error, "the bitrate functions need it");
+  CheckCodecId(review, "audio");
+  CheckNotZero(review, Audio::TAG_LAYOUT, "the channel layout is 0: it names no speaker");
+  CheckEnumeration(review, Audio::TAG_SAMPLE_FORMAT, AV_SAMPLE_FMT_NB, "a sample format");
+}
+
+// Asked only when no error was found, so that every setting the look-ups read is there and of
+// its type: what they still refuse, the presets refuse, and say why.
+void CheckBitrate(Review& review, const boost::intrusive_ptr<const IFormatCodec>& codec,
+                  bool video) {
+  if (review.HasError()) return;
+  long long minimum = 0;
+  long long maximum = 0;
+  try {
+    minimum = video ? GetMinVideoBitrate(codec) : GetMinAudioBitrate(codec);
+    maximum = video ? GetMaxVideoBitrate(codec) : GetMaxAudioBitrate(codec);
+  } catch (const Tarvek::Exception& e) {
+    const std::string* what = boost::get_error_info<DescriptionInfo>(e);
+    review.Add(Severity::Error, "",
+               "the presets refuse this description: " +
+                   (what != nullptr ? *what : std::string("no reason given")));
+    return;
+  }
+  const Core::Property* node = review.Integer(IFormatCodec::TAG_BITRATE);
+  if (node == nullptr) return;
+  const long long bitrate = node->GetInt64();
+  if (bitrate < minimum || bitrate > maximum) {
+    review.Add(
+        Severity::Warning, IFormatCodec::TAG_BITRATE,
+        "bit_rate " + std::to_string(bitrate) + " b/s is " +
+            (bitrate < minimum ? "below the presets' minimum of " + std::to_string(minimum)
+                               : "above the presets' maximum of " + std::to_string(maximum)) +
+            " b/s for this description");
+  }
+}
+
+}  // namespace
+
+const char* SeverityName(Severity severity) noexcept {
+  return severity == Severity::Error ? "error" : "warning";
+}
+
+std::vector<Finding> Validate(const boost::intrusive_ptr<const IFormat>& description) {
+  std::vector<Finding> findings;
+  if (!description) {
+    findings.push_back({Severity::Error, "", "there is no description (a null pointer)"});
+    return findings;
+  }
+  const std::string kind = DescriptionKind(description);
+  Review review(description->GetProperty(), findings);
+  CheckTypesAndRanges(review, KnownKeys(kind));
+  if (kind == "video" || kind == "audio") {
+    const bool video = kind == "video";
+    if (video) {
+      CheckVideo(review);
+    } else {
+      CheckAudio(review);
+    }
+    const boost::intrusive_ptr<const IFormatCodec> codec(
+        dynamic_cast<const IFormatCodec*>(description.get()));
+    CheckBitrate(review, codec, video);
+  }
+  return findings;
+}
+
+}  // namespace Conf
+}  // namespace Tarvek

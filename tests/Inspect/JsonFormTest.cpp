@@ -1,0 +1,299 @@
+// The JSON form: exact round trips of every kind of description, and the refusal of bad text
+// with a message that says where and what.
+#include <gtest/gtest.h>
+
+#include <Tarvek/Formats.h>
+#include <boost/exception/get_error_info.hpp>
+#include <functional>
+#include <limits>
+#include <nlohmann/json.hpp>
+#include <string>
+#include <vector>
+
+namespace {
+
+using namespace Tarvek;
+using namespace Tarvek::Conf;
+using Json = nlohmann::ordered_json;
+
+constexpr long long kMin = std::numeric_limits<long long>::min();
+constexpr long long kMax = std::numeric_limits<long long>::max();
+const std::string kNotUtf8("\xc3\x28\xff", 3);
+
+// A chain of containers `levels` deep, itself included.
+Core::Property Chain(int levels) {
+  Core::Property node("d");
+  for (int i = 1; i < levels; ++i) {
+    Core::Property parent("d");
+    parent.SetChild("d", node);
+    node = std::move(parent);
+  }
+  return node;
+}
+
+// Every shared setting at an extreme, repeated names of every type, odd names and texts, a tree
+// as deep as the form holds, runtime entries of every shape and private data of every byte.
+void FillEverything(IFormatCodec& codec) {
+  codec.SetCodecName("H.264 / \"AVC\"\n");
+  codec.SetCodecID("h264");
+  codec.SetCodecTag(kMin);
+  codec.SetBitrateMode("vbr");
+  codec.SetBitrate(kMax);
+  codec.SetQuality(-1);
+  codec.SetLossless(true);
+  codec.SetThreadNumber(4294967295u);
+  codec.SetTwoPassEncoding(false);
+  codec.SetGlobalHeader(true);
+  codec.SetMainStream(false);
+  Core::Property options("options");
+  options.CreateChildT<std::string>("x", "1");
+  options.CreateChildT<long long>("x", 1);
+  options.CreateChildT<bool>("x", false);
+  options.SetChild("x[1]").CreateChildT<std::string>("", std::string("nul\0byte", 8));
+  codec.SetOptionsEncode(options);
+  codec.SetOptionsAnalyze(Chain(kJsonFormMaxDepth - 1));  // the options child is its top
+
+  Core::Property tree = codec.GetProperty();
+  tree.CreateChildT<std::string>("a/b~c\\\"", kNotUtf8);
+  tree.CreateChildT<long long>(kNotUtf8, kMax);
+  tree.CreateChildT<std::string>("", "");
+  codec.SetProperty(tree);
+
+  boost::property_tree::ptree& entries = codec.GetInternalProperties();
+  entries.data() = "root text";
+  entries.put("runtime.nested.key", "v");
+  entries.add("dup", "1");
+  entries.add("dup", "2");
+  entries.push_back({kNotUtf8, boost::property_tree::ptree(kNotUtf8)});
+
+  std::string bytes;
+  for (int i = 0; i < 256; ++i) bytes += static_cast<char>(i);
+  codec.SetPrivateData(CreateBlob(bytes.data(), bytes.size()));
+}
+
+std::vector<boost::intrusive_ptr<IFormatCodec>> EveryKind() {
+  auto video = FormatCodecVideo::Create();
+  video->InitByFrameAspect(720, 576, 16, 9);
+  video->SetFrameRate(30000, 1001);
+  video->SetPixelFormat(AV_PIX_FMT_YUV420P10LE);
+  auto audio = FormatCodecAudio::Create();
+  audio->SetLanguage("eng");
+  audio->SetSampleRate(-48000);
+  audio->SetChannelLayout(static_cast<ChannelLayout>(0xffffffffu));
+  audio->SetFrameSize(1024);
+  audio->SetSampleFormat(AV_SAMPLE_FMT_FLTP);
+  auto subtitle = FormatCodecSubtitle::Create();
+  subtitle->SetLanguage("fra");
+  subtitle->SetTitle("Titre \xc3\xa9t\xc3\xa9");
+  subtitle->SetAuthor("A. Smithee");
+  subtitle->SetSubtitleHeader("[Script Info]\r\nScriptType: v4.00+\r\n");
+  subtitle->SetDVBWidth(720);
+  subtitle->SetDVBHeight(576);
+  std::vector<boost::intrusive_ptr<IFormatCodec>> all = {FormatCodec::Create(), video, audio,
+                                                         subtitle};
+  for (const auto& codec : all) FillEverything(*codec);
+  return all;
+}
+
+std::string Bytes(const boost::intrusive_ptr<IBlob>& blob) {
+  if (!blob) return "<none>";
+  return std::string(reinterpret_cast<const char*>(blob->GetData()), blob->GetSize());
+}
+
+TEST(JsonForm, RoundTripIsExactForEveryKind) {
+  for (const auto& original : EveryKind()) {
+    SCOPED_TRACE(DescriptionKind(original));
+    const std::string text = ToJson(original);
+    const auto back = FromJson(text);
+    ASSERT_TRUE(back);
+    EXPECT_STREQ(DescriptionKind(back), DescriptionKind(original));
+    EXPECT_TRUE(back->Compare(original));
+    EXPECT_TRUE(Diff(original, back).empty());
+    EXPECT_TRUE(back->GetInternalProperties() == original->GetInternalProperties());
+    EXPECT_EQ(Bytes(back->GetPrivateData()), Bytes(original->GetPrivateData()));
+    EXPECT_EQ(ToJson(back), text);
+  }
+}
+
+TEST(JsonForm, KeepsValueTypesAndEveryBitOf64BitIntegers) {
+  auto codec = FormatCodec::Create();
+  Core::Property tree = codec->GetProperty();
+  tree.CreateChildT<long long>("n", 1);
+  tree.CreateChildT<std::string>("n", "1");
+  tree.CreateChildT<long long>("min", kMin);
+  codec->SetProperty(tree);
+  const Json document = Json::parse(ToJson(codec));
+  EXPECT_EQ(document["format"], "tarvek-description");
+  EXPECT_EQ(document["version"], kJsonFormVersion);
+  EXPECT_EQ(document["kind"], "codec");
+  const Json& children = document["tree"]["children"];
+  const std::size_t last = children.size() - 1;
+  EXPECT_EQ(children[last - 2], Json::parse(R"({"name": "n", "type": "int64", "value": 1})"));
+  EXPECT_EQ(children[last - 1], Json::parse(R"({"name": "n", "type": "string", "value": "1"})"));
+  EXPECT_EQ(children[last]["value"].get<long long>(), kMin);
+  EXPECT_TRUE(FromJson(document.dump())->Compare(codec));
+}
+
+TEST(JsonForm, TellsNoPrivateDataFromEmptyPrivateData) {
+  auto codec = FormatCodecVideo::Create();
+  EXPECT_FALSE(FromJson(ToJson(codec))->GetPrivateData());
+  codec->SetPrivateData(CreateBlob(nullptr, 0));
+  const auto back = FromJson(ToJson(codec))->GetPrivateData();
+  ASSERT_TRUE(back);
+  EXPECT_EQ(back->GetSize(), 0u);
+}
+
+TEST(JsonForm, ToJsonRefusesNullAndTreesDeeperThanTheLimit) {
+  EXPECT_THROW(ToJson(nullptr), JsonFormError);
+  auto codec = FormatCodec::Create();
+  codec->SetOptionsEncode(Chain(kJsonFormMaxDepth));
+  EXPECT_THROW(ToJson(codec), JsonFormError);
+}
+
+TEST(JsonForm, IgnoresUnknownTopLevelMembers) {
+  Json document = Json::parse(ToJson(FormatCodecAudio::Create()));
+  document["bitrate"] = {{"default", 1}};
+  EXPECT_NO_THROW(FromJson(document.dump()));
+}
+
+// A document of a small video, and the index of its child `name` in the tree.
+Json SmallVideo() {
+  auto video = FormatCodecVideo::Create();
+  video->InitByPixelAspect(1920, 1080, 1, 1);
+  video->SetLossless(true);
+  video->SetPrivateData(CreateBlob("abc", 3));
+  return Json::parse(ToJson(video));
+}
+
+std::size_t IndexOf(const Json& document, const std::string& name) {
+  const Json& children = document["tree"]["children"];
+  for (std::size_t i = 0; i < children.size(); ++i) {
+    if (children[i]["name"] == name) return i;
+  }
+  ADD_FAILURE() << "no child " << name;
+  return 0;
+}
+
+struct BadText {
+  const char* what;
+  std::function<std::string()> text;
+  std::string pointer;  // "-" when the error carries no pointer
+  std::string message;  // the whole DescriptionInfo, or its start followed by "..."
+};
+
+// The document of SmallVideo with `edit` applied to it.
+std::function<std::string()> Edited(std::function<void(Json&)> edit) {
+  return [edit] {
+    Json document = SmallVideo();
+    edit(document);
+    return document.dump();
+  };
+}
+
+// The child `name` of the small video's tree, to edit.
+Json& Child(Json& document, const std::string& name) {
+  return document["tree"]["children"][IndexOf(document, name)];
+}
+
+std::string PointerOf(const std::string& name) {
+  return "/tree/children/" + std::to_string(IndexOf(SmallVideo(), name));
+}
+
+TEST(JsonForm, RejectsEveryKindOfBadTextSayingWhereAndWhat) {
+  const std::string width = PointerOf("width");
+  const std::string lossless = PointerOf("lossless");
+  const std::string deep = std::string(200, '[') + std::string(200, ']');
+  const std::vector<BadText> cases = {
+      {"malformed", [] { return std::string("{\"format\": tru}"); }, "-",
+       "malformed JSON at line 1, column 15: syntax error while parsing value - invalid literal; "
+       "last read: '\"format\": tru}'"},
+      {"not an object", [] { return std::string("[1]"); }, "",
+       "the document: expected an object (a description), found an array"},
+      {"other format", Edited([](Json& d) { d["format"] = "other"; }), "/format",
+       "/format: expected \"tarvek-description\", found \"other\""},
+      {"unknown version", Edited([](Json& d) { d["version"] = 2; }), "/version",
+       "/version: version 2 is not known; this library reads version 1"},
+      {"version as text", Edited([](Json& d) { d["version"] = "1"; }), "/version",
+       "/version: expected an integer, found a string"},
+      {"unknown kind", Edited([](Json& d) { d["kind"] = "image"; }), "/kind",
+       "/kind: unknown kind \"image\"; expected \"codec\", \"video\", \"audio\" or \"subtitle\""},
+      {"other object name", Edited([](Json& d) { d["object_name"] = "audio_codec"; }),
+       "/object_name",
+       "/object_name: a video description is named \"video_codec\", found \"audio_codec\""},
+      {"missing tree", Edited([](Json& d) { d.erase("tree"); }), "",
+       "the document: missing member \"tree\""},
+      {"leaf root", Edited([](Json& d) {
+         d["tree"] = {{"type", "int64"}, {"value", 1}};
+       }),
+       "/tree/type", "/tree/type: the root of the tree must be a container, found \"int64\""},
+      {"integer as text", Edited([](Json& d) { Child(d, "width")["value"] = "1920"; }),
+       width + "/value", width + "/value: expected an integer, found a string"},
+      {"fraction", Edited([](Json& d) { Child(d, "width")["value"] = 1.5; }), width + "/value",
+       width + "/value: expected an integer, found the number 1.5"},
+      {"beyond 64 bits", Edited([](Json& d) { Child(d, "width")["value"] = 9223372036854775808u; }),
+       width + "/value",
+       width + "/value: expected an integer in the 64-bit signed range, found 9223372036854775808"},
+      {"bool as number", Edited([](Json& d) { Child(d, "lossless")["value"] = 1; }),
+       lossless + "/value", lossless + "/value: expected true or false, found the number 1"},
+      {"unknown type", Edited([](Json& d) { Child(d, "width")["type"] = "float"; }),
+       width + "/type",
+       width + "/type: unknown type \"float\"; expected \"bool\", \"int64\", \"string\" or "
+               "\"container\""},
+      {"unknown member", Edited([](Json& d) { Child(d, "width")["unit"] = "px"; }), width + "/unit",
+       width + "/unit: unknown member \"unit\" here"},
+      {"missing type", Edited([](Json& d) { Child(d, "width").erase("type"); }), width,
+       width + ": missing member \"type\""},
+      {"name twice", Edited([](Json& d) { Child(d, "width")["name_base64"] = "eA=="; }), width,
+       width + ": both \"name\" and \"name_base64\" given; give one"},
+      {"node not an object", Edited([](Json& d) { d["tree"]["children"][0] = Json::array(); }),
+       "/tree/children/0",
+       "/tree/children/0: expected an object (a node of the tree), found an array"},
+      {"no metadata", Edited([](Json& d) { d["tree"]["children"].erase(IndexOf(d, "metadata")); }),
+       "/tree/children",
+       "/tree/children: no child named \"metadata\", which every description has"},
+      {"entries not a list", Edited([](Json& d) { d["internal"]["children"] = 3; }),
+       "/internal/children", "/internal/children: expected an array, found the number 3"},
+      {"base64 alphabet", Edited([](Json& d) { d["private_data"] = "YW!j"; }), "/private_data",
+       "/private_data: invalid base64: character 3, '!', is not in the base64 alphabet"},
+      {"base64 length", Edited([](Json& d) { d["private_data"] = "YWJ"; }), "/private_data",
+       "/private_data: invalid base64: its length, 3, is not a multiple of 4"},
+      {"base64 stray bits", Edited([](Json& d) { d["private_data"] = "YWK="; }), "/private_data",
+       "/private_data: invalid base64: stray bits before the padding"},
+      {"private data type", Edited([](Json& d) { d["private_data"] = 5; }), "/private_data",
+       "/private_data: expected a base64 string or null, found the number 5"},
+      {"absurd nesting", [deep] { return deep; }, "-",
+       "JSON nested deeper than 129 levels at line 1, column 130; a description's tree holds at "
+       "most 64 levels"},
+      {"tree too deep", Edited([](Json& d) {
+         Json node = {{"name", "d"}, {"type", "container"}, {"children", Json::array()}};
+         for (int i = 0; i < kJsonFormMaxDepth - 1; ++i) {
+           node = {{"name", "d"}, {"type", "container"}, {"children", {node}}};
+         }
+         d["tree"]["children"].push_back(node);
+       }),
+       "-", "JSON nested deeper than 129 levels at line 1, column ..."},
+  };
+  for (const BadText& bad : cases) {
+    SCOPED_TRACE(bad.what);
+    try {
+      FromJson(bad.text());
+      ADD_FAILURE() << "accepted";
+    } catch (const JsonFormError& e) {
+      const std::string* message = boost::get_error_info<DescriptionInfo>(e);
+      ASSERT_NE(message, nullptr);
+      const std::size_t dots = bad.message.rfind("...");
+      if (dots != std::string::npos && dots + 3 == bad.message.size()) {
+        EXPECT_EQ(message->substr(0, dots), bad.message.substr(0, dots));
+      } else {
+        EXPECT_EQ(*message, bad.message);
+      }
+      const std::string* pointer = boost::get_error_info<JsonFormError::JsonPointerInfo>(e);
+      if (bad.pointer != "-") {
+        ASSERT_NE(pointer, nullptr);
+        EXPECT_EQ(*pointer, bad.pointer);
+      }
+    }
+  }
+}
+
+}  // namespace
