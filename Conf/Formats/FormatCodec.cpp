@@ -92,14 +92,16 @@ bool FormatCodec::ExistsOptionsEncode() const {
 bool FormatCodec::ExistsOptionsAnalyze() const {
   return property_.ChildExists(TAG_CODEC_OPTIONS_ANALYZE);
 }
+// SetChild assigns to the child, or appends a complete copy when SetProperty removed it, so a
+// copy that fails leaves the tree as it was (no empty child appended first).
 void FormatCodec::SetOptionsEncode(const Core::Property& options) {
-  property_[TAG_CODEC_OPTIONS_ENCODE] = options;
+  property_.SetChild(TAG_CODEC_OPTIONS_ENCODE, options);
 }
 const Core::Property& FormatCodec::GetOptionsEncode() const {
   return property_[TAG_CODEC_OPTIONS_ENCODE];
 }
 void FormatCodec::SetOptionsAnalyze(const Core::Property& options) {
-  property_[TAG_CODEC_OPTIONS_ANALYZE] = options;
+  property_.SetChild(TAG_CODEC_OPTIONS_ANALYZE, options);
 }
 const Core::Property& FormatCodec::GetOptionsAnalyze() const {
   return property_[TAG_CODEC_OPTIONS_ANALYZE];

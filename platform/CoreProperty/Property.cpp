@@ -20,6 +20,27 @@ const char* PropertyTypeName(PropertyTypes type) noexcept {
 }
 
 namespace Core {
+namespace {
+
+// A copy of `value`, built in place from its alternative rather than by the variant's copy
+// constructor: when copying a string throws, libstdc++ 12's copy constructor goes on to destroy
+// a variant that holds nothing (undefined behaviour); a failed in-place construction leaves no
+// variant behind to destroy.
+template <class Value>
+Value CopyOf(const Value& value) {
+  switch (value.index()) {
+    case 1:
+      return Value(std::in_place_index<1>, std::get<1>(value));
+    case 2:
+      return Value(std::in_place_index<2>, std::get<2>(value));
+    case 3:
+      return Value(std::in_place_index<3>, std::get<3>(value));
+    default:
+      return Value();
+  }
+}
+
+}  // namespace
 
 Property::Property(const std::string& name) : name_(name) {}
 Property::Property(const std::string& name, bool value) : name_(name), value_(value) {}
@@ -29,7 +50,8 @@ Property::Property(const std::string& name, const std::string& value)
 Property::Property(const std::string& name, const char* value)
     : name_(name), value_(std::string(value)) {}
 
-Property::Property(const Property& other) = default;
+Property::Property(const Property& other)
+    : name_(other.name_), value_(CopyOf(other.value_)), children_(other.children_) {}
 Property::Property(Property&& other) noexcept
     : name_(std::move(other.name_)),
       value_(std::move(other.value_)),
@@ -41,7 +63,7 @@ Property::~Property() = default;
 Property& Property::operator=(const Property& other) {
   if (this == &other) return *this;
   // Copy first: `other` may be a descendant of this node, which the swap below destroys.
-  Value value(other.value_);
+  Value value(CopyOf(other.value_));
   Children children(other.children_);
   value_.swap(value);
   children_.swap(children);
