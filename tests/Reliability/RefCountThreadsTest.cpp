@@ -14,6 +14,8 @@
 
 #include <Tarvek/Formats.h>
 
+#include "Support/TestSupport.h"
+
 namespace {
 
 namespace Conf = Tarvek::Conf;
@@ -41,29 +43,6 @@ class CountedVideo final : public Conf::FormatCodecVideo {
   ~CountedVideo() override { ++Destroyed(); }
 };
 
-// A blob that counts its destructions.
-class CountedBlob final : public Tarvek::IBlob {
- public:
-  static std::atomic<int>& Destroyed() {
-    static std::atomic<int> destroyed{0};
-    return destroyed;
-  }
-  ~CountedBlob() override { ++Destroyed(); }
-  int AddRef() const override { return count_.AddRefImpl(); }
-  int GetRefCount() const override { return count_.GetRefCountImpl(); }
-  int Release() const override {
-    const int left = count_.ReleaseImpl();
-    if (left == 0) delete this;
-    return left;
-  }
-  const std::uint8_t* GetData() const override { return bytes_; }
-  std::size_t GetSize() const override { return sizeof bytes_; }
-
- private:
-  Tarvek::RefCountImpl count_;
-  std::uint8_t bytes_[4] = {1, 2, 3, 4};
-};
-
 struct Descriptions {
   VideoPtr video;
   AudioPtr audio;
@@ -87,7 +66,7 @@ Descriptions Make() {
   made.audio->SetSampleFormat(AV_SAMPLE_FMT_FLTP);
   made.subtitle = Conf::FormatCodecSubtitle::Create();
   made.subtitle->SetTitle("Commentary");
-  made.blob = BlobPtr(new CountedBlob);
+  made.blob = TarvekTest::CountingBlob::Create();
   made.video->SetPrivateData(made.blob);
   made.audio->SetPrivateData(made.blob);
   return made;
@@ -150,7 +129,7 @@ int ReadConcurrently(const Descriptions& shared, Descriptions handover, const Ex
 
 TEST(RefCountThreadsTest, SharedReadsCopiesAndClonesKeepCountsRight) {
   const int videosBefore = CountedVideo::Destroyed();
-  const int blobsBefore = CountedBlob::Destroyed();
+  const int blobsBefore = TarvekTest::CountingBlob::Live();
   Descriptions shared = Make();
   Descriptions handover = Make();
   const Expected expected{Conf::GetDefaultVideoBitrate(ConstCodecPtr(shared.video)),
@@ -170,8 +149,8 @@ TEST(RefCountThreadsTest, SharedReadsCopiesAndClonesKeepCountsRight) {
   for (int i = 0; i < kThreads; ++i) {
     EXPECT_EQ(wrong[static_cast<std::size_t>(i)], 0) << "thread " << i;
   }
-  EXPECT_EQ(CountedVideo::Destroyed(), videosBefore + 1);  // the handed-over video, once
-  EXPECT_EQ(CountedBlob::Destroyed(), blobsBefore + 1);    // the handed-over blob, once
+  EXPECT_EQ(CountedVideo::Destroyed(), videosBefore + 1);        // the handed-over video, once
+  EXPECT_EQ(TarvekTest::CountingBlob::Live(), blobsBefore + 1);  // the shared blob only
   EXPECT_EQ(shared.video->GetRefCount(), 1);
   EXPECT_EQ(shared.audio->GetRefCount(), 1);
   EXPECT_EQ(shared.subtitle->GetRefCount(), 1);
@@ -179,7 +158,7 @@ TEST(RefCountThreadsTest, SharedReadsCopiesAndClonesKeepCountsRight) {
 
   shared = Descriptions();
   EXPECT_EQ(CountedVideo::Destroyed(), videosBefore + 2);
-  EXPECT_EQ(CountedBlob::Destroyed(), blobsBefore + 2);
+  EXPECT_EQ(TarvekTest::CountingBlob::Live(), blobsBefore);
 }
 
 }  // namespace
