@@ -30,6 +30,8 @@
 #include <Tarvek/Formats.h>
 #include <boost/exception/get_error_info.hpp>
 
+#include "../tests/Support/CountingBlob.h"
+
 namespace {
 
 namespace Conf = Tarvek::Conf;
@@ -589,29 +591,7 @@ bool CheckedSet(Codec& codec, bool inMetadata, const Property& value, Set&& set)
 
 // ---- The program's state ----
 
-// A blob that counts its live instances, so that a blob freed twice or never shows.
-class CountingBlob final : public IBlob {
- public:
-  static int& Live() {
-    static int live = 0;
-    return live;
-  }
-  CountingBlob() { ++Live(); }
-  ~CountingBlob() override { --Live(); }
-  int AddRef() const override { return count_.AddRefImpl(); }
-  int GetRefCount() const override { return count_.GetRefCountImpl(); }
-  int Release() const override {
-    const int left = count_.ReleaseImpl();
-    if (left == 0) delete this;
-    return left;
-  }
-  const std::uint8_t* GetData() const override { return bytes_; }
-  std::size_t GetSize() const override { return sizeof bytes_; }
-
- private:
-  Tarvek::RefCountImpl count_;
-  std::uint8_t bytes_[3] = {7, 8, 9};
-};
+using TarvekTest::CountingBlob;  // counts live instances: a blob freed twice or never shows
 
 struct State {
   CodecPtr codecs[kCodecSlots];
@@ -917,7 +897,7 @@ void OpBlob(State& state, Program& program) {
       break;
     }
     case 2:
-      slot = new CountingBlob;
+      slot = CountingBlob::Create();
       break;
     case 3:
       slot = state.blobs[program.Below(kBlobSlots)];
@@ -1202,7 +1182,7 @@ void Run(Program& program) {
                                                  kSubtitle, kVideo, kAudio};
   for (std::size_t i = 0; i < kCodecSlots; ++i) state.codecs[i] = Create(kInitial[i]);
   state.blobs[0] = Tarvek::CreateBlob("abc", 3);
-  state.blobs[1] = new CountingBlob;
+  state.blobs[1] = CountingBlob::Create();
   CheckState(state);
   constexpr std::size_t kOperationCount = sizeof kOperations / sizeof kOperations[0];
   while (!program.Done()) {

@@ -17,7 +17,9 @@
 #include <vector>
 
 #include <Tarvek/Formats.h>
+
 #include <boost/exception/get_error_info.hpp>
+#include "CountingBlob.h"
 
 namespace Tarvek {
 namespace Core {
@@ -102,36 +104,6 @@ class CaptureStdout {
  private:
   std::ostringstream buffer_;
   std::streambuf* previous_;
-};
-
-// A blob that counts live instances, to prove that holders release what they hold.
-class CountingBlob final : public Tarvek::IBlob {
- public:
-  static std::atomic<int>& Live() {
-    static std::atomic<int> live{0};
-    return live;
-  }
-
-  static boost::intrusive_ptr<CountingBlob> Create() {
-    return boost::intrusive_ptr<CountingBlob>(new CountingBlob);
-  }
-
-  int AddRef() const override { return count_.AddRefImpl(); }
-  int GetRefCount() const override { return count_.GetRefCountImpl(); }
-  int Release() const override {
-    const int left = count_.ReleaseImpl();
-    if (left == 0) delete this;
-    return left;
-  }
-  const std::uint8_t* GetData() const override { return bytes_; }
-  std::size_t GetSize() const override { return sizeof bytes_; }
-
- private:
-  CountingBlob() { ++Live(); }
-  ~CountingBlob() override { --Live(); }
-
-  Tarvek::RefCountImpl count_;
-  std::uint8_t bytes_[4] = {1, 2, 3, 4};
 };
 
 }  // namespace TarvekTest
