@@ -22,32 +22,61 @@
 #include "BenchSettings.h"
 
 // ---------------------------------------------------------------------------------------------
-// Heap accounting: a replacement global operator new/delete that counts calls and live bytes.
-// Each block carries its size in a header, so that the bytes a description holds can be counted
-// even where the sized delete is not used. Only C++ allocations are seen: the peers allocate with
-// g_malloc and av_malloc, which this does not count.
+// Heap accounting: a replacement global operator new/delete that counts allocation calls and,
+// while a measurement asks for it, records the blocks allocated with their sizes, so that the
+// bytes one description holds can be summed. Only C++ allocations are seen: the peers allocate
+// with g_malloc and av_malloc, which this does not count. So the counting must cost next to
+// nothing and must not change what the allocator does: no header on the blocks (it would move
+// every library allocation into a larger size class, which the peers' never are) and no locked
+// read-modify-write (the benchmarks run on one thread; were another thread to allocate meanwhile,
+// a count could be lost, never corrupted).
 namespace {
 
 std::atomic<long long> g_allocations{0};
-std::atomic<long long> g_live_bytes{0};
 
-constexpr std::size_t kHeader = alignof(std::max_align_t);
+// The blocks recorded while tracing is on, still live. Searched linearly: a measurement records
+// a few dozen.
+struct TracedBlock {
+  void* block;
+  std::size_t size;
+};
+constexpr std::size_t kMostTraced = 1024;
+TracedBlock g_traced[kMostTraced];
+std::size_t g_traced_count = 0;
+bool g_tracing = false;
+bool g_traced_overflow = false;
 
 void* CountedAlloc(std::size_t size) noexcept {
-  void* block = std::malloc(size + kHeader);
+  void* block = std::malloc(size == 0 ? 1 : size);
   if (block == nullptr) return nullptr;
-  *static_cast<std::size_t*>(block) = size;
-  g_allocations.fetch_add(1, std::memory_order_relaxed);
-  g_live_bytes.fetch_add(static_cast<long long>(size), std::memory_order_relaxed);
-  return static_cast<char*>(block) + kHeader;
+  g_allocations.store(g_allocations.load(std::memory_order_relaxed) + 1, std::memory_order_relaxed);
+  if (g_tracing) {
+    if (g_traced_count < kMostTraced) {
+      g_traced[g_traced_count++] = {block, size};
+    } else {
+      g_traced_overflow = true;
+    }
+  }
+  return block;
 }
 
 void CountedFree(void* pointer) noexcept {
   if (pointer == nullptr) return;
-  void* block = static_cast<char*>(pointer) - kHeader;
-  g_live_bytes.fetch_sub(static_cast<long long>(*static_cast<std::size_t*>(block)),
-                         std::memory_order_relaxed);
-  std::free(block);
+  for (std::size_t i = 0; i < g_traced_count; ++i) {
+    if (g_traced[i].block == pointer) {
+      g_traced[i] = g_traced[--g_traced_count];
+      break;
+    }
+  }
+  std::free(pointer);
+}
+
+// The bytes of the recorded blocks still live.
+long long TracedBytes() {
+  long long bytes = 0;
+  for (std::size_t i = 0; i < g_traced_count; ++i)
+    bytes += static_cast<long long>(g_traced[i].size);
+  return bytes;
 }
 
 void* CountedAllocOrThrow(std::size_t size) {
@@ -227,11 +256,14 @@ void TarvekHeapOfOneDescription(benchmark::State& state) {
     VideoPtr video = BuildFull();
     benchmark::DoNotOptimize(video.get());
   }
-  const long long bytes_before = g_live_bytes.load();
   const long long calls_before = g_allocations.load();
+  g_traced_count = 0;
+  g_tracing = true;
   VideoPtr video = BuildFull();
-  const long long bytes = g_live_bytes.load() - bytes_before;
+  g_tracing = false;
+  const long long bytes = TracedBytes();
   const long long calls = g_allocations.load() - calls_before;
+  if (g_traced_overflow) state.SkipWithError("too many blocks to record");
   // Blocks freed while building (temporaries) are counted as calls but not as bytes held.
   state.counters["heap_bytes"] = static_cast<double>(bytes);
   state.counters["allocations"] = static_cast<double>(calls);

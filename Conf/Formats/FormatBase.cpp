@@ -7,9 +7,15 @@ namespace Tarvek {
 namespace Conf {
 
 FormatBase::FormatBase(const std::string& name) : property_(name) {
-  internal_properties_.put(TAG_OBJECT, name);
+  // The key holds no '.', so put() would read it as a path of one top-level entry; push_back adds
+  // that entry without parsing a path.
+  internal_properties_.push_back(
+      boost::property_tree::ptree::value_type(TAG_OBJECT, boost::property_tree::ptree(name)));
   property_.SetChild(TAG_METADATA);
 }
+
+FormatBase::FormatBase(TreesOf trees)
+    : property_(trees.source.property_), internal_properties_(trees.source.internal_properties_) {}
 
 FormatBase::~FormatBase() = default;
 
@@ -63,11 +69,6 @@ bool FormatBase::Compare(boost::intrusive_ptr<const IFormat> other) const {
 }
 
 bool FormatBase::IsCompatible(boost::intrusive_ptr<const IFormat> /*other*/) const { return true; }
-
-void FormatBase::CopyTreesFrom(const FormatBase& source) {
-  property_ = source.property_;
-  internal_properties_ = source.internal_properties_;
-}
 
 }  // namespace Conf
 }  // namespace Tarvek

@@ -7,6 +7,7 @@
 #include <boost/intrusive_ptr.hpp>
 #include <boost/property_tree/ptree.hpp>
 #include <string>
+#include <typeinfo>
 
 #include "../../Core/Interfaces/Export.h"
 #include "../../Core/Interfaces/Property.h"
@@ -49,8 +50,25 @@ class TARVEK_FORMATS_API FormatBase : public virtual IFormat {
   bool IsCompatible(boost::intrusive_ptr<const IFormat> other) const override;
 
  protected:
-  /// Copies `source`'s property tree and runtime entries into this description (for Clone).
-  void CopyTreesFrom(const FormatBase& source);
+  /// Names the description a copy starts from (see the copying constructors, used by Clone).
+  struct TreesOf {
+    const FormatBase& source;
+  };
+  /// A description holding copies of `trees.source`'s property tree and runtime entries, with a
+  /// fresh count. The trees are copied once, straight from the source.
+  explicit FormatBase(TreesOf trees);
+
+  /// `other` as the interface `Kind`, or null when it is not one (or is null): a dynamic_cast,
+  /// with a shortcut for the usual case of a description of exactly the class `Exact`, which two
+  /// type comparisons establish.
+  template <class Kind, class Exact>
+  static const Kind* AsKind(const IFormat* other) {
+    if (other == nullptr) return nullptr;
+    if (typeid(*other) == typeid(Exact)) {
+      return static_cast<const Exact*>(dynamic_cast<const void*>(other));
+    }
+    return dynamic_cast<const Kind*>(other);
+  }
 
   // Declared in construction order: count, property tree, runtime entries.
  private:

@@ -15,6 +15,8 @@ FormatCodec::FormatCodec(const std::string& name) : FormatBase(name) {
   SetCodecName("Unknown codec");
 }
 
+FormatCodec::FormatCodec(TreesOf trees) : FormatBase(trees) {}
+
 FormatCodec::~FormatCodec() = default;
 
 int FormatCodec::GetCodecType() const { return -1; }

@@ -84,6 +84,11 @@ class TARVEK_FORMATS_API FormatCodec : public virtual IFormatCodec, public virtu
   boost::intrusive_ptr<IBlob> GetPrivateData() override;
   void SetPrivateData(boost::intrusive_ptr<IBlob> data) override;
 
+ protected:
+  /// The codec part of a copy: the copied tree already holds everything, so it lays nothing
+  /// down; the private data is not copied.
+  explicit FormatCodec(TreesOf trees);
+
  private:
   boost::intrusive_ptr<IBlob> private_data_;
 };

@@ -20,10 +20,8 @@ FormatCodecAudio::FormatCodecAudio(const FormatCodecAudio& source)
       IFormat(),
       IFormatCodec(),
       IFormatCodecAudio(),
-      FormatBase(TAG_FORMAT_CODEC_AUDIO),
-      FormatCodec(TAG_FORMAT_CODEC_AUDIO) {
-  CopyTreesFrom(source);
-}
+      FormatBase(TreesOf{source}),
+      FormatCodec(TreesOf{source}) {}
 
 FormatCodecAudio::~FormatCodecAudio() = default;
 
@@ -31,7 +29,7 @@ int FormatCodecAudio::GetCodecType() const { return 1; }
 
 bool FormatCodecAudio::IsCompatible(boost::intrusive_ptr<const IFormat> other) const {
   // `other` holds a reference for the whole call, released on every way out.
-  const auto* audio = dynamic_cast<const IFormatCodecAudio*>(other.get());
+  const auto* audio = AsKind<IFormatCodecAudio, FormatCodecAudio>(other.get());
   if (audio == nullptr) return false;
   return GetSampleRate() == audio->GetSampleRate() &&
          GetChannelLayout() == audio->GetChannelLayout() &&

@@ -17,10 +17,8 @@ FormatCodecSubtitle::FormatCodecSubtitle(const FormatCodecSubtitle& source)
       IFormat(),
       IFormatCodec(),
       IFormatCodecSubtitle(),
-      FormatBase(TAG_FORMAT_CODEC_SUBTITLE),
-      FormatCodec(TAG_FORMAT_CODEC_SUBTITLE) {
-  CopyTreesFrom(source);
-}
+      FormatBase(TreesOf{source}),
+      FormatCodec(TreesOf{source}) {}
 
 FormatCodecSubtitle::~FormatCodecSubtitle() = default;
 

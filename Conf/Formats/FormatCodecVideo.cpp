@@ -51,10 +51,8 @@ FormatCodecVideo::FormatCodecVideo(const FormatCodecVideo& source)
       IFormat(),
       IFormatCodec(),
       IFormatCodecVideo(),
-      FormatBase(TAG_FORMAT_CODEC_VIDEO),
-      FormatCodec(TAG_FORMAT_CODEC_VIDEO) {
-  CopyTreesFrom(source);
-}
+      FormatBase(TreesOf{source}),
+      FormatCodec(TreesOf{source}) {}
 
 FormatCodecVideo::~FormatCodecVideo() = default;
 
@@ -62,7 +60,7 @@ int FormatCodecVideo::GetCodecType() const { return 0; }
 
 bool FormatCodecVideo::IsCompatible(boost::intrusive_ptr<const IFormat> other) const {
   // `other` holds a reference for the whole call, released on every way out.
-  const auto* video = dynamic_cast<const IFormatCodecVideo*>(other.get());
+  const auto* video = AsKind<IFormatCodecVideo, FormatCodecVideo>(other.get());
   if (video == nullptr) return false;
   return GetWidth() == video->GetWidth() && GetHeight() == video->GetHeight() &&
          GetPixelAspectX() == video->GetPixelAspectX() &&

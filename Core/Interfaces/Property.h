@@ -32,11 +32,11 @@
 #ifndef TARVEK_CORE_INTERFACES_PROPERTY_H_
 #define TARVEK_CORE_INTERFACES_PROPERTY_H_
 
+#include <cstdint>
 #include <iosfwd>
 #include <list>
 #include <string>
 #include <type_traits>
-#include <variant>
 
 #include "../Errors/AddStack.h"
 #include "../Errors/PropertyException.h"
@@ -149,8 +149,28 @@ class TARVEK_CORE_API Property {
   Property& CreateChildT(const std::string& name, const T& value);
 
  private:
-  using Value = std::variant<std::monostate, bool, long long, std::string>;
+  // Internal helpers with access to the members, defined in the library (Property.cpp).
+  struct Internals;
+  // A container's index of its children by name, once it has enough of them to pay (see
+  // Property.cpp): a block of slots, null when there is none.
+  struct ChildIndex {
+    void* block;
+    std::uint32_t mask;   // slot count - 1
+    std::uint32_t names;  // distinct names indexed
+    std::uint64_t epoch;  // the rename epoch it was built in
+  };
+  // A leaf's value or a container's index; type_ tells which member lives.
+  union Storage {
+    Storage() noexcept : index{} {}
+    ~Storage() {}
+    bool flag;
+    long long integer;
+    std::string text;
+    ChildIndex index;
+  };
 
+  // Indexes the child just appended and returns it. Never throws.
+  Property& AdoptLast() noexcept;
   // The refusal of the child helpers, with the items naming this node and `method` attached.
   MethodIsNotApplicable NotApplicableError(const char* method) const;
   [[noreturn]] void ThrowNotApplicable(const char* method, int line, const char* function) const;
@@ -160,17 +180,12 @@ class TARVEK_CORE_API Property {
                                        const char* function) const;
 
   std::string name_;
-  Value value_;
+  Storage storage_;
+  std::uint32_t name_hash_;  // a hash of name_, compared before the texts
+  unsigned char type_;       // a PropertyTypes value
+  bool indexed_;             // whether the parent's index counts this node
   Children children_;
 };
-
-/// Prints `property` to `out` for a person to read: one line a node, "name (type)" for
-/// containers and "name (type): value" for leaves, indented by two spaces a level starting at
-/// `indent` levels. Strings are quoted, with quotes, backslashes and control bytes escaped;
-/// an empty name shows as "<unnamed>". Without `showTypes` the "(type)" parts are left out;
-/// without `recursive` only the node itself is printed.
-TARVEK_CORE_API void PrintPropertyValue(const Property& property, int indent, std::ostream& out,
-                                        bool showTypes, bool recursive);
 
 namespace Detail {
 
@@ -215,6 +230,41 @@ constexpr const char* kPropertyHeader = "Core/Interfaces/Property.h";
 
 // The typed child helpers are defined here, inline, and their refusals are recorded at the lines
 // of this header on which they throw; keep the two throw statements where they are.
+// CreateChildT constructs the child in place at the end of the list: nothing is looked up, so a
+// name that is present already gets a second child after the others. If construction fails, the
+// list is left as it was. It is the building block of SetChildT and serves callers that build
+// trees with repeated names, such as lists of entries; a refusal leaves the node as it was.
+template <class T>
+Property& Property::CreateChildT(const std::string& name, const T& value) {
+  if (GetType() != PropertyTypeContainer) {
+    ThrowWithLocation(__LINE__, Detail::kPropertyHeader, Detail::ChildTSignature<T>::kCreate,
+                      AddStack(NotApplicableError("CreateChildT")));
+  }
+  children_.emplace_back(name, value);
+  return AdoptLast();
+}
+
+// SetChildT checks the type itself rather than leaving it to CreateChildT, so that a refusal
+// always names the helper the caller called. An existing child keeps its place among its
+// siblings, and references to it stay valid; it is retyped by assignment when it held another
+// type (a string written over an int64 leaf makes a string leaf). Only a missing child is
+// appended, as the last one. With several children of the name, the first is the one set.
+// Either way the returned reference is to the child that now holds the value, valid until the
+// child itself is removed. Like CreateChildT, a refusal leaves the node exactly as it was.
+template <class T>
+Property& Property::SetChildT(const std::string& name, const T& value) {
+  if (GetType() != PropertyTypeContainer) {
+    ThrowWithLocation(__LINE__, Detail::kPropertyHeader, Detail::ChildTSignature<T>::kSet,
+                      AddStack(NotApplicableError("SetChildT")));
+  }
+  const iterator found = FindChild(name);
+  if (found != children_.end()) {
+    *found = value;
+    return *found;
+  }
+  return CreateChildT<T>(name, value);
+}
+
 // The library exports one instance of each helper per value type; users link those.
 extern template TARVEK_FORMATS_API Property& Property::SetChildT<bool>(const std::string&,
                                                                        const bool&);
@@ -229,41 +279,13 @@ extern template TARVEK_FORMATS_API Property& Property::CreateChildT<long long>(c
 extern template TARVEK_FORMATS_API Property& Property::CreateChildT<std::string>(
     const std::string&, const std::string&);
 
-// CreateChildT constructs the child in place at the end of the list: nothing is looked up, so a
-// name that is present already gets a second child after the others. If construction fails, the
-// list is left as it was. It is the building block of SetChildT and is exported for callers that
-// build trees with repeated names, such as lists of entries; a refusal leaves the node as it
-// was.
-template <class T>
-Property& Property::CreateChildT(const std::string& name, const T& value) {
-  if (GetType() != PropertyTypeContainer) {
-    ThrowWithLocation(__LINE__, Detail::kPropertyHeader, Detail::ChildTSignature<T>::kCreate,
-                      AddStack(NotApplicableError("CreateChildT")));
-  }
-  return children_.emplace_back(name, value);
-}
-
-// SetChildT checks the type itself rather than leaving it to CreateChildT, so that a refusal
-// always names the helper the caller called. An existing child keeps its place among its
-// siblings, and references to it stay valid; it is retyped by assignment when it held another
-// type (a string written over an int64 leaf makes a string leaf). Only a missing child is
-// appended, as the last one. With several children of the name, the first is the one set.
-// Either way the returned reference is to the child that now holds the value, valid until the
-// child itself is removed.
-// Like CreateChildT, a refusal leaves the node and its children exactly as they were.
-template <class T>
-Property& Property::SetChildT(const std::string& name, const T& value) {
-  if (GetType() != PropertyTypeContainer) {
-    ThrowWithLocation(__LINE__, Detail::kPropertyHeader, Detail::ChildTSignature<T>::kSet,
-                      AddStack(NotApplicableError("SetChildT")));
-  }
-  const iterator found = FindChild(name);
-  if (found != children_.end()) {
-    *found = value;
-    return *found;
-  }
-  return CreateChildT<T>(name, value);
-}
+/// Prints `property` to `out` for a person to read: one line a node, "name (type)" for
+/// containers and "name (type): value" for leaves, indented by two spaces a level starting at
+/// `indent` levels. Strings are quoted, with quotes, backslashes and control bytes escaped;
+/// an empty name shows as "<unnamed>". Without `showTypes` the "(type)" parts are left out;
+/// without `recursive` only the node itself is printed.
+TARVEK_CORE_API void PrintPropertyValue(const Property& property, int indent, std::ostream& out,
+                                        bool showTypes, bool recursive);
 
 }  // namespace Core
 }  // namespace Tarvek

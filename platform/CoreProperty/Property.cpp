@@ -1,6 +1,12 @@
 // The core property library: Tarvek::Core::Property.
 #include <Tarvek/Core/Interfaces/Property.h>
 
+#include <atomic>
+#include <cstddef>
+#include <cstdint>
+#include <cstring>
+#include <new>
+#include <type_traits>
 #include <utility>
 
 namespace Tarvek {
@@ -20,178 +26,469 @@ const char* PropertyTypeName(PropertyTypes type) noexcept {
 }
 
 namespace Core {
-namespace {
 
-// A copy of `value`, built in place from its alternative rather than by the variant's copy
-// constructor: when copying a string throws, libstdc++ 12's copy constructor goes on to destroy
-// a variant that holds nothing (undefined behaviour); a failed in-place construction leaves no
-// variant behind to destroy.
-template <class Value>
-Value CopyOf(const Value& value) {
-  switch (value.index()) {
-    case 1:
-      return Value(std::in_place_index<1>, std::get<1>(value));
-    case 2:
-      return Value(std::in_place_index<2>, std::get<2>(value));
-    case 3:
-      return Value(std::in_place_index<3>, std::get<3>(value));
-    default:
-      return Value();
+// Look-up by name. Every node keeps a 32-bit hash of its name, so a scan of the children compares
+// texts only where the hashes agree. A container with kIndexThreshold children or more also keeps
+// an index: an open-addressing table (linear probing, at most three quarters full) of iterators to
+// its children, with one control byte a slot: 0 for an empty slot, else 0x80 and the top seven
+// bits of the name's hash. Only the first child of each name is entered, so a look-up still gives
+// the first child of a name. List iterators stay valid while other children come and go and when
+// the list is swapped, so the index moves with the children it describes.
+//
+// Renames. An index finds a child under the name it had when it was entered. A node that is a
+// child can be renamed in place only by moving into it or out of it; when that happens to a child
+// an index counts (indexed_), a process-wide rename epoch advances, and every index built in an
+// earlier epoch is no longer trusted: look-ups in its container scan until the next append
+// rebuilds it. Renaming children in place is rare, so this costs nothing in practice, and no
+// look-up ever gives a wrong answer. Readers only read the epoch, so trees shared for reading
+// stay safe to read from any number of threads.
+//
+// The index is a cache: when its block cannot be allocated there is none, and look-ups scan.
+// Building it never throws.
+struct Property::Internals {
+  static constexpr std::size_t kIndexThreshold = 8;
+  static constexpr std::uint32_t kFirstSlots = 32;
+
+  static_assert(std::is_trivially_copyable_v<iterator> &&
+                    std::is_trivially_destructible_v<iterator>,
+                "index slots are raw copies of list iterators");
+  static_assert(alignof(iterator) <= __STDCPP_DEFAULT_NEW_ALIGNMENT__,
+                "index blocks come from operator new");
+
+  static std::atomic<std::uint64_t> rename_epoch;
+
+  static std::uint64_t Epoch() noexcept { return rename_epoch.load(std::memory_order_relaxed); }
+  static void NoteRename() noexcept { rename_epoch.fetch_add(1, std::memory_order_relaxed); }
+
+  static std::uint64_t Load64(const char* p) noexcept {
+    std::uint64_t word;
+    std::memcpy(&word, p, sizeof word);
+    return word;
   }
+  static std::uint64_t Load32(const char* p) noexcept {
+    std::uint32_t word;
+    std::memcpy(&word, p, sizeof word);
+    return word;
+  }
+  static std::uint64_t Rotate(std::uint64_t x, int bits) noexcept {
+    return (x << bits) | (x >> (64 - bits));
+  }
+
+  // A hash for short texts (names are mostly under 16 bytes): at most two overlapping words are
+  // read, and longer names fold their leading words in first. Not stored anywhere lasting, so it
+  // need not be the same across machines.
+  static std::uint32_t Hash(const std::string& name) noexcept {
+    constexpr std::uint64_t k0 = 0x9E3779B97F4A7C15ull;
+    constexpr std::uint64_t k1 = 0xC2B2AE3D27D4EB4Full;
+    constexpr std::uint64_t k2 = 0x165667B19E3779F9ull;
+    const char* data = name.data();
+    const std::size_t size = name.size();
+    std::uint64_t a = 0;
+    std::uint64_t b = 0;
+    if (size > 16) {
+      const char* const last = data + size - 16;
+      std::uint64_t folded = 0;
+      for (const char* p = data; p < last; p += 8) folded = Rotate((folded ^ Load64(p)) * k0, 29);
+      a = Load64(last) ^ folded;
+      b = Load64(last + 8);
+    } else if (size >= 8) {
+      a = Load64(data);
+      b = Load64(data + size - 8);
+    } else if (size >= 4) {
+      a = Load32(data);
+      b = Load32(data + size - 4);
+    } else if (size > 0) {
+      const auto byte = [&](std::size_t i) {
+        return std::uint64_t{static_cast<unsigned char>(data[i])};
+      };
+      a = byte(0) << 16 | byte(size / 2) << 8 | byte(size - 1);
+    }
+    std::uint64_t h = (a * k1) ^ Rotate(b * k2, 31) ^ (size * k0);
+    h ^= h >> 32;
+    h *= k1;
+    h ^= h >> 29;
+    return static_cast<std::uint32_t>(h >> 32);
+  }
+
+  // Text equality without a library call for the usual short names.
+  static bool SameText(const std::string& a, const std::string& b) noexcept {
+    const std::size_t size = a.size();
+    if (size != b.size()) return false;
+    const char* x = a.data();
+    const char* y = b.data();
+    if (size >= 8 && size <= 16) {
+      return Load64(x) == Load64(y) && Load64(x + size - 8) == Load64(y + size - 8);
+    }
+    if (size >= 4 && size < 8) {
+      return Load32(x) == Load32(y) && Load32(x + size - 4) == Load32(y + size - 4);
+    }
+    return std::memcmp(x, y, size) == 0;
+  }
+
+  static bool HasName(const Property& node, const std::string& key, std::uint32_t hash) noexcept {
+    return node.name_hash_ == hash && SameText(node.name_, key);
+  }
+
+  static unsigned char Tag(std::uint32_t hash) noexcept {
+    return static_cast<unsigned char>(0x80u | (hash >> 25));
+  }
+  static iterator* Slots(const ChildIndex& index) noexcept {
+    return static_cast<iterator*>(index.block);
+  }
+  static unsigned char* Control(const ChildIndex& index) noexcept {
+    return reinterpret_cast<unsigned char*>(Slots(index) + index.mask + 1);
+  }
+  static bool Usable(const Property& node) noexcept {
+    return node.type_ == PropertyTypeContainer && node.storage_.index.block != nullptr &&
+           node.storage_.index.epoch == Epoch();
+  }
+  // Whether one more name fits without the table passing three quarters full.
+  static bool HasRoom(const ChildIndex& index) noexcept {
+    return (std::uint64_t{index.names} + 1) * 4 <= (std::uint64_t{index.mask} + 1) * 3;
+  }
+
+  // The first child of `self` named `key`, or the end of its children.
+  template <class Self>
+  static auto Find(Self& self, const std::string& key) noexcept -> decltype(self.children_.end()) {
+    if (self.children_.empty()) return self.children_.end();
+    const std::uint32_t hash = Hash(key);
+    if (Usable(self)) {
+      const ChildIndex& index = self.storage_.index;
+      const unsigned char tag = Tag(hash);
+      const unsigned char* const control = Control(index);
+      for (std::uint32_t i = hash & index.mask;; i = (i + 1) & index.mask) {
+        if (control[i] == 0) return self.children_.end();
+        if (control[i] == tag && HasName(*Slots(index)[i], key, hash)) return Slots(index)[i];
+      }
+    }
+    for (auto it = self.children_.begin(); it != self.children_.end(); ++it) {
+      if (HasName(*it, key, hash)) return it;
+    }
+    return self.children_.end();
+  }
+
+  // Enters `child` unless an earlier child has its name. The table has room.
+  static void Enter(ChildIndex& index, iterator child) noexcept {
+    const std::uint32_t hash = child->name_hash_;
+    const unsigned char tag = Tag(hash);
+    unsigned char* const control = Control(index);
+    for (std::uint32_t i = hash & index.mask;; i = (i + 1) & index.mask) {
+      if (control[i] == 0) {
+        control[i] = tag;
+        new (Slots(index) + i) iterator(child);
+        ++index.names;
+        return;
+      }
+      if (control[i] == tag && HasName(*Slots(index)[i], child->name_, hash)) return;
+    }
+  }
+
+  static void DropIndex(Property& node) noexcept {
+    ::operator delete(node.storage_.index.block);
+    node.storage_.index = ChildIndex{};
+  }
+
+  // (Re)builds the index of a container from its children, or leaves it without one when it has
+  // too few children or the block cannot be had.
+  static void BuildIndex(Property& node) noexcept {
+    DropIndex(node);
+    const std::size_t count = node.children_.size();
+    if (count < kIndexThreshold || count > (std::size_t{1} << 28)) return;
+    std::uint64_t slots = kFirstSlots;
+    while ((count + 1) * 4 > slots * 3) slots *= 2;
+    void* const block = ::operator new(slots*(sizeof(iterator) + 1), std::nothrow);
+    if (block == nullptr) return;
+    ChildIndex index{block, static_cast<std::uint32_t>(slots - 1), 0, Epoch()};
+    std::memset(Control(index), 0, slots);
+    for (auto it = node.children_.begin(); it != node.children_.end(); ++it) {
+      Enter(index, it);
+      it->indexed_ = true;
+    }
+    node.storage_.index = index;
+  }
+
+  // Frees what the storage holds (a string or an index); the node is then a container without an
+  // index, its children untouched.
+  static void Release(Property& node) noexcept {
+    if (node.type_ == PropertyTypeString) {
+      node.storage_.text.~basic_string();
+      new (&node.storage_.index) ChildIndex{};
+    } else if (node.type_ == PropertyTypeContainer) {
+      DropIndex(node);
+    }
+    node.type_ = PropertyTypeContainer;
+    node.storage_.index = ChildIndex{};
+  }
+
+  // Empties `node`: no value, no children, no index; its name and place stay.
+  static void Clear(Property& node) noexcept {
+    Release(node);
+    node.children_.clear();
+  }
+
+  // Puts a string into the storage of `node`, which holds nothing. The string is built by the
+  // caller: a string constructor that throws may already have written into its storage, and the
+  // storage must keep meaning "no index" until the string is complete.
+  static void PlaceText(Property& node, std::string&& text) noexcept {
+    new (&node.storage_.text) std::string(std::move(text));
+  }
+
+  // Copies `from`'s value into `to`, which holds nothing. A container copies no index: `to`
+  // builds its own over its own children. On failure `to` still holds nothing.
+  static void CopyValue(Property& to, const Property& from) {
+    switch (from.type_) {
+      case PropertyTypeBool:
+        to.storage_.flag = from.storage_.flag;
+        break;
+      case PropertyTypeInt64:
+        to.storage_.integer = from.storage_.integer;
+        break;
+      case PropertyTypeString:
+        PlaceText(to, std::string(from.storage_.text));
+        break;
+      default:
+        return;
+    }
+    to.type_ = from.type_;
+  }
+
+  // Moves `from`'s value or index into `to`, which holds nothing; `from` then holds nothing.
+  static void MoveValue(Property& to, Property& from) noexcept {
+    switch (from.type_) {
+      case PropertyTypeBool:
+        to.storage_.flag = from.storage_.flag;
+        break;
+      case PropertyTypeInt64:
+        to.storage_.integer = from.storage_.integer;
+        break;
+      case PropertyTypeString:
+        new (&to.storage_.text) std::string(std::move(from.storage_.text));
+        from.storage_.text.~basic_string();
+        break;
+      default:
+        to.storage_.index = from.storage_.index;
+        break;
+    }
+    to.type_ = from.type_;
+    from.type_ = PropertyTypeContainer;
+    new (&from.storage_.index) ChildIndex{};
+  }
+
+  // Exchanges value (or index) and children; names, hashes and places stay.
+  static void SwapContent(Property& a, Property& b) noexcept {
+    Property held{std::string()};
+    MoveValue(held, a);
+    MoveValue(a, b);
+    MoveValue(b, held);
+    a.children_.swap(b.children_);
+  }
+
+  static void Rename(Property& node, const std::string& name) {
+    node.name_ = name;
+    node.name_hash_ = Hash(node.name_);
+  }
+};
+
+std::atomic<std::uint64_t> Property::Internals::rename_epoch{0};
+
+Property::Property(const std::string& name)
+    : name_(name),
+      name_hash_(Internals::Hash(name)),
+      type_(PropertyTypeContainer),
+      indexed_(false) {}
+
+Property::Property(const std::string& name, bool value) : Property(name) {
+  storage_.flag = value;
+  type_ = PropertyTypeBool;
 }
 
-}  // namespace
+Property::Property(const std::string& name, long long value) : Property(name) {
+  storage_.integer = value;
+  type_ = PropertyTypeInt64;
+}
 
-Property::Property(const std::string& name) : name_(name) {}
-Property::Property(const std::string& name, bool value) : name_(name), value_(value) {}
-Property::Property(const std::string& name, long long value) : name_(name), value_(value) {}
-Property::Property(const std::string& name, const std::string& value)
-    : name_(name), value_(value) {}
+Property::Property(const std::string& name, const std::string& value) : Property(name) {
+  Internals::PlaceText(*this, std::string(value));
+  type_ = PropertyTypeString;
+}
+
 Property::Property(const std::string& name, const char* value)
-    : name_(name), value_(std::string(value)) {}
+    : Property(name, std::string(value)) {}
 
+// The value is copied last, in the body: if it throws, the members built so far are destroyed and
+// the storage holds nothing that would need freeing.
 Property::Property(const Property& other)
-    : name_(other.name_), value_(CopyOf(other.value_)), children_(other.children_) {}
+    : name_(other.name_),
+      name_hash_(other.name_hash_),
+      type_(PropertyTypeContainer),
+      indexed_(false),
+      children_(other.children_) {
+  Internals::CopyValue(*this, other);
+  if (type_ == PropertyTypeContainer) Internals::BuildIndex(*this);
+}
+
 Property::Property(Property&& other) noexcept
     : name_(std::move(other.name_)),
-      value_(std::move(other.value_)),
-      children_(std::move(other.children_)) {
-  other.value_ = std::monostate();
+      name_hash_(other.name_hash_),
+      type_(PropertyTypeContainer),
+      indexed_(false) {
+  // Swapped, not moved: a swap keeps iterators to the elements valid, so the index stays good.
+  children_.swap(other.children_);
+  Internals::MoveValue(*this, other);
+  other.name_.clear();
+  other.name_hash_ = Internals::Hash(other.name_);
+  if (other.indexed_) Internals::NoteRename();
 }
-Property::~Property() = default;
+
+Property::~Property() { Internals::Release(*this); }
 
 Property& Property::operator=(const Property& other) {
   if (this == &other) return *this;
-  // Copy first: `other` may be a descendant of this node, which the swap below destroys.
-  Value value(CopyOf(other.value_));
-  Children children(other.children_);
-  value_.swap(value);
-  children_.swap(children);
+  // Copy first: `other` may be a descendant of this node, which the exchange below destroys.
+  Property copy{std::string()};
+  copy.children_ = other.children_;
+  Internals::CopyValue(copy, other);
+  Internals::SwapContent(*this, copy);
+  if (type_ == PropertyTypeContainer) Internals::BuildIndex(*this);
   return *this;
 }
 
 Property& Property::operator=(Property&& other) noexcept {
   if (this == &other) return *this;
   // Detach `other`'s content before dropping ours: `other` may live inside our children.
-  std::string name(std::move(other.name_));
-  Value value(std::move(other.value_));
-  Children children(std::move(other.children_));
-  other.value_ = std::monostate();
-  other.children_.clear();
-  name_.swap(name);
-  value_.swap(value);
-  children_.swap(children);
+  Property taken(std::move(other));
+  if (indexed_ && taken.name_ != name_) Internals::NoteRename();
+  name_.swap(taken.name_);
+  std::swap(name_hash_, taken.name_hash_);
+  Internals::SwapContent(*this, taken);
   return *this;
 }
 
 Property& Property::operator=(bool value) {
-  value_ = value;
-  children_.clear();
+  Internals::Clear(*this);
+  storage_.flag = value;
+  type_ = PropertyTypeBool;
   return *this;
 }
 
 Property& Property::operator=(long long value) {
-  value_ = value;
-  children_.clear();
+  Internals::Clear(*this);
+  storage_.integer = value;
+  type_ = PropertyTypeInt64;
   return *this;
 }
 
 Property& Property::operator=(const std::string& value) {
-  // Build the new value first: `value` may be this node's own string, or a descendant's.
-  Value replacement(value);
-  value_.swap(replacement);
-  children_.clear();
+  // A string leaf reuses its buffer; assignment leaves it as it was if it throws.
+  if (type_ == PropertyTypeString) {
+    storage_.text = value;
+    return *this;
+  }
+  // Copy first: `value` may be a descendant's string, which Clear destroys.
+  std::string copy(value);
+  Internals::Clear(*this);
+  Internals::PlaceText(*this, std::move(copy));
+  type_ = PropertyTypeString;
   return *this;
 }
 
 Property& Property::operator=(const char* value) { return *this = std::string(value); }
 
-PropertyTypes Property::GetType() const noexcept {
-  switch (value_.index()) {
-    case 1:
-      return PropertyTypeBool;
-    case 2:
-      return PropertyTypeInt64;
-    case 3:
-      return PropertyTypeString;
-    default:
-      return PropertyTypeContainer;
-  }
-}
+PropertyTypes Property::GetType() const noexcept { return static_cast<PropertyTypes>(type_); }
 
 bool Property::ChildExists(const std::string& key) const noexcept {
-  return FindChild(key) != children_.end();
+  return Internals::Find(*this, key) != children_.end();
 }
 
 Property::iterator Property::FindChild(const std::string& key) noexcept {
-  for (auto it = children_.begin(); it != children_.end(); ++it) {
-    if (it->name_ == key) return it;
-  }
-  return children_.end();
+  return Internals::Find(*this, key);
 }
 
 Property::const_iterator Property::FindChild(const std::string& key) const noexcept {
-  for (auto it = children_.begin(); it != children_.end(); ++it) {
-    if (it->name_ == key) return it;
-  }
-  return children_.end();
+  return Internals::Find(*this, key);
 }
 
 const Property& Property::operator[](const std::string& key) const {
-  const const_iterator found = FindChild(key);
+  const const_iterator found = Internals::Find(*this, key);
   if (found == children_.end()) ThrowChildNotFound(key, __LINE__, BOOST_CURRENT_FUNCTION);
   return *found;
 }
 
 Property& Property::operator[](const std::string& key) {
-  const iterator found = FindChild(key);
+  const iterator found = Internals::Find(*this, key);
   if (found != children_.end()) return *found;
-  if (GetType() != PropertyTypeContainer) {
+  if (type_ != PropertyTypeContainer) {
     ThrowNotApplicable("operator[]", __LINE__, BOOST_CURRENT_FUNCTION);
   }
-  return children_.emplace_back(key);
+  children_.emplace_back(key);
+  return AdoptLast();
 }
 
 Property& Property::SetChild(const std::string& key) {
-  if (GetType() != PropertyTypeContainer) {
+  if (type_ != PropertyTypeContainer) {
     ThrowNotApplicable("SetChild", __LINE__, BOOST_CURRENT_FUNCTION);
   }
-  const iterator found = FindChild(key);
-  if (found == children_.end()) return children_.emplace_back(key);
-  found->value_ = std::monostate();
-  found->children_.clear();
+  const iterator found = Internals::Find(*this, key);
+  if (found == children_.end()) {
+    children_.emplace_back(key);
+    return AdoptLast();
+  }
+  Internals::Clear(*found);
   return *found;
 }
 
 Property& Property::SetChild(const std::string& key, const Property& value) {
-  if (GetType() != PropertyTypeContainer) {
+  if (type_ != PropertyTypeContainer) {
     ThrowNotApplicable("SetChild", __LINE__, BOOST_CURRENT_FUNCTION);
   }
-  const iterator found = FindChild(key);
+  const iterator found = Internals::Find(*this, key);
   if (found != children_.end()) return *found = value;
   // Append a complete copy, then rename it: `value` may be this node itself.
   Property child(value);
-  child.name_ = key;
-  return children_.emplace_back(std::move(child));
+  Internals::Rename(child, key);
+  children_.emplace_back(std::move(child));
+  return AdoptLast();
+}
+
+Property& Property::AdoptLast() noexcept {
+  const iterator last = std::prev(children_.end());
+  ChildIndex& index = storage_.index;
+  if (Internals::Usable(*this) && Internals::HasRoom(index)) {
+    Internals::Enter(index, last);
+    last->indexed_ = true;
+  } else if (children_.size() >= Internals::kIndexThreshold) {
+    Internals::BuildIndex(*this);
+  }
+  return *last;
 }
 
 bool Property::GetBool() const {
-  if (const bool* value = std::get_if<bool>(&value_)) return *value;
+  if (type_ == PropertyTypeBool) return storage_.flag;
   ThrowWrongType(PropertyTypeBool, "GetBool", __LINE__, BOOST_CURRENT_FUNCTION);
 }
 
 long long Property::GetInt64() const {
-  if (const long long* value = std::get_if<long long>(&value_)) return *value;
+  if (type_ == PropertyTypeInt64) return storage_.integer;
   ThrowWrongType(PropertyTypeInt64, "GetInt64", __LINE__, BOOST_CURRENT_FUNCTION);
 }
 
 const std::string& Property::GetString() const {
-  if (const std::string* value = std::get_if<std::string>(&value_)) return *value;
+  if (type_ == PropertyTypeString) return storage_.text;
   ThrowWrongType(PropertyTypeString, "GetString", __LINE__, BOOST_CURRENT_FUNCTION);
 }
 
 bool Property::operator==(const Property& other) const noexcept {
-  return name_ == other.name_ && value_ == other.value_ && children_ == other.children_;
+  if (type_ != other.type_ || name_hash_ != other.name_hash_ || name_ != other.name_) return false;
+  switch (type_) {
+    case PropertyTypeBool:
+      return storage_.flag == other.storage_.flag;
+    case PropertyTypeInt64:
+      return storage_.integer == other.storage_.integer;
+    case PropertyTypeString:
+      return storage_.text == other.storage_.text;
+    default:
+      return children_ == other.children_;
+  }
 }
 
 MethodIsNotApplicable Property::NotApplicableError(const char* method) const {
