@@ -50,7 +50,7 @@ void FormatBase::SetMetadata(const Core::Property& metadata) {
   property_.SetChild(TAG_METADATA, metadata);
 }
 
-const Core::Property& FormatBase::GetMetadata() const { return property_[TAG_METADATA]; }
+const Core::Property& FormatBase::GetMetadata() const { return property_[KeyOf<TAG_METADATA>()]; }
 
 void FormatBase::PrintContent() {
   std::ostream& out = std::cout;

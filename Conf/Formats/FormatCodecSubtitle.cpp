@@ -24,54 +24,62 @@ FormatCodecSubtitle::~FormatCodecSubtitle() = default;
 
 int FormatCodecSubtitle::GetCodecType() const { return 3; }
 
-std::string FormatCodecSubtitle::GetLanguage() const { return property_[TAG_LANGUAGE].GetString(); }
-bool FormatCodecSubtitle::ExistsLanguage() const { return property_.ChildExists(TAG_LANGUAGE); }
+std::string FormatCodecSubtitle::GetLanguage() const {
+  return property_[KeyOf<TAG_LANGUAGE>()].GetString();
+}
+bool FormatCodecSubtitle::ExistsLanguage() const {
+  return property_.ChildExists(KeyOf<TAG_LANGUAGE>());
+}
 void FormatCodecSubtitle::SetLanguage(const std::string& language) {
   property_.SetChildT<std::string>(TAG_LANGUAGE, language);
 }
 
 std::string FormatCodecSubtitle::GetTitle() const {
-  return property_[IFormatFile::TAG_TITLE].GetString();
+  return property_[KeyOf<IFormatFile::TAG_TITLE>()].GetString();
 }
 bool FormatCodecSubtitle::ExistsTitle() const {
-  return property_.ChildExists(IFormatFile::TAG_TITLE);
+  return property_.ChildExists(KeyOf<IFormatFile::TAG_TITLE>());
 }
 void FormatCodecSubtitle::SetTitle(const std::string& title) {
   property_.SetChildT<std::string>(IFormatFile::TAG_TITLE, title);
 }
 
 std::string FormatCodecSubtitle::GetAuthor() const {
-  return property_[TAG_SUBTITLE_AUTHOR].GetString();
+  return property_[KeyOf<TAG_SUBTITLE_AUTHOR>()].GetString();
 }
 bool FormatCodecSubtitle::ExistsAuthor() const {
-  return property_.ChildExists(TAG_SUBTITLE_AUTHOR);
+  return property_.ChildExists(KeyOf<TAG_SUBTITLE_AUTHOR>());
 }
 void FormatCodecSubtitle::SetAuthor(const std::string& author) {
   property_.SetChildT<std::string>(TAG_SUBTITLE_AUTHOR, author);
 }
 
 std::string FormatCodecSubtitle::GetSubtitleHeader() const {
-  return property_[TAG_SUBTITLE_HEADER].GetString();
+  return property_[KeyOf<TAG_SUBTITLE_HEADER>()].GetString();
 }
 bool FormatCodecSubtitle::ExistsSubtitleHeader() const {
-  return property_.ChildExists(TAG_SUBTITLE_HEADER);
+  return property_.ChildExists(KeyOf<TAG_SUBTITLE_HEADER>());
 }
 void FormatCodecSubtitle::SetSubtitleHeader(const std::string& header) {
   property_.SetChildT<std::string>(TAG_SUBTITLE_HEADER, header);
 }
 
 unsigned int FormatCodecSubtitle::GetDVBWidth() const {
-  return static_cast<unsigned int>(property_[TAG_DVB_WIDTH].GetInt64());
+  return static_cast<unsigned int>(property_[KeyOf<TAG_DVB_WIDTH>()].GetInt64());
 }
-bool FormatCodecSubtitle::ExistsDVBWidth() const { return property_.ChildExists(TAG_DVB_WIDTH); }
+bool FormatCodecSubtitle::ExistsDVBWidth() const {
+  return property_.ChildExists(KeyOf<TAG_DVB_WIDTH>());
+}
 void FormatCodecSubtitle::SetDVBWidth(unsigned int width) {
   property_.SetChildT<long long>(TAG_DVB_WIDTH, width);
 }
 
 unsigned int FormatCodecSubtitle::GetDVBHeight() const {
-  return static_cast<unsigned int>(property_[TAG_DVB_HEIGHT].GetInt64());
+  return static_cast<unsigned int>(property_[KeyOf<TAG_DVB_HEIGHT>()].GetInt64());
 }
-bool FormatCodecSubtitle::ExistsDVBHeight() const { return property_.ChildExists(TAG_DVB_HEIGHT); }
+bool FormatCodecSubtitle::ExistsDVBHeight() const {
+  return property_.ChildExists(KeyOf<TAG_DVB_HEIGHT>());
+}
 void FormatCodecSubtitle::SetDVBHeight(unsigned int height) {
   property_.SetChildT<long long>(TAG_DVB_HEIGHT, height);
 }

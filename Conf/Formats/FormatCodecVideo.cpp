@@ -67,32 +67,38 @@ bool FormatCodecVideo::IsCompatible(boost::intrusive_ptr<const IFormat> other) c
          GetPixelAspectY() == video->GetPixelAspectY();
 }
 
-unsigned int FormatCodecVideo::GetWidth() const { return LowBits(property_[TAG_WIDTH].GetInt64()); }
-bool FormatCodecVideo::ExistsWidth() const { return property_.ChildExists(TAG_WIDTH); }
+unsigned int FormatCodecVideo::GetWidth() const {
+  return LowBits(property_[KeyOf<TAG_WIDTH>()].GetInt64());
+}
+bool FormatCodecVideo::ExistsWidth() const { return property_.ChildExists(KeyOf<TAG_WIDTH>()); }
 void FormatCodecVideo::SetWidth(unsigned int width) {
   property_.SetChildT<long long>(TAG_WIDTH, width);
 }
 
 unsigned int FormatCodecVideo::GetHeight() const {
-  return LowBits(property_[TAG_HEIGHT].GetInt64());
+  return LowBits(property_[KeyOf<TAG_HEIGHT>()].GetInt64());
 }
-bool FormatCodecVideo::ExistsHeight() const { return property_.ChildExists(TAG_HEIGHT); }
+bool FormatCodecVideo::ExistsHeight() const { return property_.ChildExists(KeyOf<TAG_HEIGHT>()); }
 void FormatCodecVideo::SetHeight(unsigned int height) {
   property_.SetChildT<long long>(TAG_HEIGHT, height);
 }
 
 unsigned int FormatCodecVideo::GetPixelAspectX() const {
-  return LowBits(property_[TAG_ASPECTX].GetInt64());
+  return LowBits(property_[KeyOf<TAG_ASPECTX>()].GetInt64());
 }
-bool FormatCodecVideo::ExistsPixelAspectX() const { return property_.ChildExists(TAG_ASPECTX); }
+bool FormatCodecVideo::ExistsPixelAspectX() const {
+  return property_.ChildExists(KeyOf<TAG_ASPECTX>());
+}
 void FormatCodecVideo::SetPixelAspectX(unsigned int aspectX) {
   property_.SetChildT<long long>(TAG_ASPECTX, aspectX);
 }
 
 unsigned int FormatCodecVideo::GetPixelAspectY() const {
-  return LowBits(property_[TAG_ASPECTY].GetInt64());
+  return LowBits(property_[KeyOf<TAG_ASPECTY>()].GetInt64());
 }
-bool FormatCodecVideo::ExistsPixelAspectY() const { return property_.ChildExists(TAG_ASPECTY); }
+bool FormatCodecVideo::ExistsPixelAspectY() const {
+  return property_.ChildExists(KeyOf<TAG_ASPECTY>());
+}
 void FormatCodecVideo::SetPixelAspectY(unsigned int aspectY) {
   property_.SetChildT<long long>(TAG_ASPECTY, aspectY);
 }
@@ -124,17 +130,21 @@ double FormatCodecVideo::GetFrameAspect() const {
 }
 
 unsigned int FormatCodecVideo::GetFrameRateNum() const {
-  return LowBits(property_[TAG_TIMEBASE_N].GetInt64());
+  return LowBits(property_[KeyOf<TAG_TIMEBASE_N>()].GetInt64());
 }
-bool FormatCodecVideo::ExistsFrameRateNum() const { return property_.ChildExists(TAG_TIMEBASE_N); }
+bool FormatCodecVideo::ExistsFrameRateNum() const {
+  return property_.ChildExists(KeyOf<TAG_TIMEBASE_N>());
+}
 void FormatCodecVideo::SetFrameRateNum(unsigned int numerator) {
   property_.SetChildT<long long>(TAG_TIMEBASE_N, numerator);
 }
 
 unsigned int FormatCodecVideo::GetFrameRateDen() const {
-  return LowBits(property_[TAG_TIMEBASE_D].GetInt64());
+  return LowBits(property_[KeyOf<TAG_TIMEBASE_D>()].GetInt64());
 }
-bool FormatCodecVideo::ExistsFrameRateDen() const { return property_.ChildExists(TAG_TIMEBASE_D); }
+bool FormatCodecVideo::ExistsFrameRateDen() const {
+  return property_.ChildExists(KeyOf<TAG_TIMEBASE_D>());
+}
 void FormatCodecVideo::SetFrameRateDen(unsigned int denominator) {
   property_.SetChildT<long long>(TAG_TIMEBASE_D, denominator);
 }
@@ -146,9 +156,11 @@ double FormatCodecVideo::GetFrameRate() const {
 }
 
 AVPixelFormat FormatCodecVideo::GetPixelFormat() const {
-  return static_cast<AVPixelFormat>(static_cast<int>(property_[TAG_PIX_FMT].GetInt64()));
+  return static_cast<AVPixelFormat>(static_cast<int>(property_[KeyOf<TAG_PIX_FMT>()].GetInt64()));
 }
-bool FormatCodecVideo::ExistsPixelFormat() const { return property_.ChildExists(TAG_PIX_FMT); }
+bool FormatCodecVideo::ExistsPixelFormat() const {
+  return property_.ChildExists(KeyOf<TAG_PIX_FMT>());
+}
 void FormatCodecVideo::SetPixelFormat(AVPixelFormat format) {
   property_.SetChildT<long long>(TAG_PIX_FMT, static_cast<long long>(format));
 }

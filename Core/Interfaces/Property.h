@@ -13,22 +13,19 @@
 //
 // Reading. The const operator[] never changes the tree: a missing child throws ChildNotFound,
 // and a typed getter on a node of another type throws WrongPropertyType. Test with ChildExists
-// first where absence is normal; the errors carry the names involved and the call stack.
-//
+// first where absence is normal; the errors carry the names involved and the call stack. A
+// look-up compares a stored hash of each name before its text, and large containers keep an
+// index of their children, so it costs a few nanoseconds whatever the number of children.
 // Writing. SetChildT overwrites the first child of a name in place or appends one; CreateChildT
 // always appends. SetChild does the same for whole sub-trees. The non-const operator[] appends
 // an empty container child when the name is missing, so use it only to write.
-//
 // Assignment. Assigning a Property copies type, value and children but keeps the target's name,
 // so a sub-tree can be replaced under its key; moving takes the name too. Assigning a plain value
 // turns the node into a leaf and drops its children.
-//
-// Errors. Adding a child to a leaf throws MethodIsNotApplicable, and nothing changes. Every
-// error derives from Tarvek::Core::PropertyException; boost::diagnostic_information() prints
-// its items, the call stack and the throw location.
-//
-// Threads. A tree is a plain value: any number of threads may read one that nobody writes;
-// writers need a lock of the caller's.
+// Errors. Adding a child to a leaf throws MethodIsNotApplicable, and nothing changes. Every error
+// derives from Tarvek::Core::PropertyException; boost::diagnostic_information() prints its items,
+// the call stack and the throw location. Threads: a tree is a plain value; any number of threads
+// may read one that nobody writes; writers need a lock of the caller's.
 #ifndef TARVEK_CORE_INTERFACES_PROPERTY_H_
 #define TARVEK_CORE_INTERFACES_PROPERTY_H_
 
@@ -45,6 +42,7 @@
 
 namespace Tarvek {
 namespace Core {
+class PropertyKey;
 
 /// A named node of a tree of typed values. Copies are deep; children are kept by value in a
 /// std::list, so a reference to a child stays valid while siblings are added or removed.
@@ -111,6 +109,10 @@ class TARVEK_CORE_API Property {
   /// The first direct child named `key`; never creates one. Throws ChildNotFound when there is
   /// none.
   const Property& operator[](const std::string& key) const;
+  /// The same three look-ups by a PropertyKey, for names looked up again and again.
+  bool ChildExists(const PropertyKey& key) const noexcept;
+  const_iterator FindChild(const PropertyKey& key) const noexcept;
+  const Property& operator[](const PropertyKey& key) const;
   /// The first direct child named `key`, appending an empty container child when there is none.
   /// Throws MethodIsNotApplicable when this node is not a container and has no such child.
   Property& operator[](const std::string& key);
@@ -149,10 +151,8 @@ class TARVEK_CORE_API Property {
   Property& CreateChildT(const std::string& name, const T& value);
 
  private:
-  // Internal helpers with access to the members, defined in the library (Property.cpp).
-  struct Internals;
-  // A container's index of its children by name, once it has enough of them to pay (see
-  // Property.cpp): a block of slots, null when there is none.
+  struct Internals;  // helpers with access to the members, in the library
+  // A container's index of its children by name (see Property.cpp); block null when none.
   struct ChildIndex {
     void* block;
     std::uint32_t mask;   // slot count - 1
@@ -174,8 +174,8 @@ class TARVEK_CORE_API Property {
   // The refusal of the child helpers, with the items naming this node and `method` attached.
   MethodIsNotApplicable NotApplicableError(const char* method) const;
   [[noreturn]] void ThrowNotApplicable(const char* method, int line, const char* function) const;
-  [[noreturn]] void ThrowWrongType(PropertyTypes requested, const char* method, int line,
-                                   const char* function) const;
+  [[noreturn]] void ThrowWrongType(PropertyTypes requested, const char* method, const char* file,
+                                   int line, const char* function) const;
   [[noreturn]] void ThrowChildNotFound(const std::string& key, int line,
                                        const char* function) const;
 
@@ -265,6 +265,25 @@ Property& Property::SetChildT(const std::string& name, const T& value) {
   return CreateChildT<T>(name, value);
 }
 
+// The typed getters are inline: a read is a type test and a load.
+inline bool Property::GetBool() const {
+  if (type_ == PropertyTypeBool) return storage_.flag;
+  ThrowWrongType(PropertyTypeBool, "GetBool", Detail::kPropertyHeader, __LINE__,
+                 BOOST_CURRENT_FUNCTION);
+}
+
+inline long long Property::GetInt64() const {
+  if (type_ == PropertyTypeInt64) return storage_.integer;
+  ThrowWrongType(PropertyTypeInt64, "GetInt64", Detail::kPropertyHeader, __LINE__,
+                 BOOST_CURRENT_FUNCTION);
+}
+
+inline const std::string& Property::GetString() const {
+  if (type_ == PropertyTypeString) return storage_.text;
+  ThrowWrongType(PropertyTypeString, "GetString", Detail::kPropertyHeader, __LINE__,
+                 BOOST_CURRENT_FUNCTION);
+}
+
 // The library exports one instance of each helper per value type; users link those.
 extern template TARVEK_FORMATS_API Property& Property::SetChildT<bool>(const std::string&,
                                                                        const bool&);
@@ -278,6 +297,21 @@ extern template TARVEK_FORMATS_API Property& Property::CreateChildT<long long>(c
                                                                                const long long&);
 extern template TARVEK_FORMATS_API Property& Property::CreateChildT<std::string>(
     const std::string&, const std::string&);
+
+/// A child name with its hash worked out once, for names looked up again and again, such as the
+/// keys of the format descriptions. A look-up by a key gives the same answer as one by its text.
+/// Throws std::bad_alloc when the name cannot be copied.
+class TARVEK_CORE_API PropertyKey {
+ public:
+  explicit PropertyKey(const std::string& name);
+  /// The name.
+  const std::string& GetName() const noexcept { return name_; }
+
+ private:
+  friend class Property;
+  std::string name_;
+  std::uint32_t hash_;
+};
 
 /// Prints `property` to `out` for a person to read: one line a node, "name (type)" for
 /// containers and "name (type): value" for leaves, indented by two spaces a level starting at

@@ -26,6 +26,61 @@ const char* PropertyTypeName(PropertyTypes type) noexcept {
 }
 
 namespace Core {
+namespace {
+
+// Advanced whenever a child that an index counts is renamed in place (see below).
+std::atomic<std::uint64_t> g_rename_epoch{0};
+
+std::uint64_t Load64(const char* p) noexcept {
+  std::uint64_t word;
+  std::memcpy(&word, p, sizeof word);
+  return word;
+}
+std::uint64_t Load32(const char* p) noexcept {
+  std::uint32_t word;
+  std::memcpy(&word, p, sizeof word);
+  return word;
+}
+std::uint64_t Rotate(std::uint64_t x, int bits) noexcept {
+  return (x << bits) | (x >> (64 - bits));
+}
+
+// Folds the words of a long name that lie between its first and last eight bytes into `a`.
+std::uint64_t FoldMiddle(const char* data, std::size_t size, std::uint64_t a) noexcept {
+  for (std::size_t i = 8; i + 8 < size; i += 8) {
+    a = Rotate(a * 0xD6E8FEB86659FD93ull, 31) ^ Load64(data + i);
+  }
+  return a;
+}
+
+// A hash for short texts (names are mostly under 16 bytes): two words that cover the text,
+// overlapping when it is shorter than 16 bytes, multiplied and folded. Longer names fold their
+// leading words in first. Kept nowhere lasting, so it need not agree between machines.
+std::uint32_t Hash(const std::string& name) noexcept {
+  constexpr std::uint64_t k0 = 0x9E3779B97F4A7C15ull;
+  constexpr std::uint64_t k1 = 0xC2B2AE3D27D4EB4Full;
+  const char* const data = name.data();
+  const std::size_t size = name.size();
+  std::uint64_t a;
+  std::uint64_t b;
+  if (size >= 8) {
+    a = Load64(data);
+    b = Load64(data + size - 8);
+    if (size > 16) a = FoldMiddle(data, size, a);
+  } else if (size >= 4) {
+    a = Load32(data);
+    b = Load32(data + size - 4);
+  } else {
+    a = size == 0 ? 0 : static_cast<unsigned char>(data[0]);
+    b = size == 0 ? 0
+                  : static_cast<unsigned char>(data[size - 1]) << 8 |
+                        static_cast<unsigned char>(data[size / 2]);
+  }
+  const std::uint64_t h = ((a ^ size) * k0) ^ (b * k1);
+  return static_cast<std::uint32_t>(h ^ (h >> 32));
+}
+
+}  // namespace
 
 // Look-up by name. Every node keeps a 32-bit hash of its name, so a scan of the children compares
 // texts only where the hashes agree. A container with kIndexThreshold children or more also keeps
@@ -55,60 +110,8 @@ struct Property::Internals {
   static_assert(alignof(iterator) <= __STDCPP_DEFAULT_NEW_ALIGNMENT__,
                 "index blocks come from operator new");
 
-  static std::atomic<std::uint64_t> rename_epoch;
-
-  static std::uint64_t Epoch() noexcept { return rename_epoch.load(std::memory_order_relaxed); }
-  static void NoteRename() noexcept { rename_epoch.fetch_add(1, std::memory_order_relaxed); }
-
-  static std::uint64_t Load64(const char* p) noexcept {
-    std::uint64_t word;
-    std::memcpy(&word, p, sizeof word);
-    return word;
-  }
-  static std::uint64_t Load32(const char* p) noexcept {
-    std::uint32_t word;
-    std::memcpy(&word, p, sizeof word);
-    return word;
-  }
-  static std::uint64_t Rotate(std::uint64_t x, int bits) noexcept {
-    return (x << bits) | (x >> (64 - bits));
-  }
-
-  // A hash for short texts (names are mostly under 16 bytes): at most two overlapping words are
-  // read, and longer names fold their leading words in first. Not stored anywhere lasting, so it
-  // need not be the same across machines.
-  static std::uint32_t Hash(const std::string& name) noexcept {
-    constexpr std::uint64_t k0 = 0x9E3779B97F4A7C15ull;
-    constexpr std::uint64_t k1 = 0xC2B2AE3D27D4EB4Full;
-    constexpr std::uint64_t k2 = 0x165667B19E3779F9ull;
-    const char* data = name.data();
-    const std::size_t size = name.size();
-    std::uint64_t a = 0;
-    std::uint64_t b = 0;
-    if (size > 16) {
-      const char* const last = data + size - 16;
-      std::uint64_t folded = 0;
-      for (const char* p = data; p < last; p += 8) folded = Rotate((folded ^ Load64(p)) * k0, 29);
-      a = Load64(last) ^ folded;
-      b = Load64(last + 8);
-    } else if (size >= 8) {
-      a = Load64(data);
-      b = Load64(data + size - 8);
-    } else if (size >= 4) {
-      a = Load32(data);
-      b = Load32(data + size - 4);
-    } else if (size > 0) {
-      const auto byte = [&](std::size_t i) {
-        return std::uint64_t{static_cast<unsigned char>(data[i])};
-      };
-      a = byte(0) << 16 | byte(size / 2) << 8 | byte(size - 1);
-    }
-    std::uint64_t h = (a * k1) ^ Rotate(b * k2, 31) ^ (size * k0);
-    h ^= h >> 32;
-    h *= k1;
-    h ^= h >> 29;
-    return static_cast<std::uint32_t>(h >> 32);
-  }
+  static std::uint64_t Epoch() noexcept { return g_rename_epoch.load(std::memory_order_relaxed); }
+  static void NoteRename() noexcept { g_rename_epoch.fetch_add(1, std::memory_order_relaxed); }
 
   // Text equality without a library call for the usual short names.
   static bool SameText(const std::string& a, const std::string& b) noexcept {
@@ -151,7 +154,13 @@ struct Property::Internals {
   template <class Self>
   static auto Find(Self& self, const std::string& key) noexcept -> decltype(self.children_.end()) {
     if (self.children_.empty()) return self.children_.end();
-    const std::uint32_t hash = Hash(key);
+    return Find(self, key, Hash(key));
+  }
+
+  // The same, with the hash of `key` already worked out.
+  template <class Self>
+  static auto Find(Self& self, const std::string& key, std::uint32_t hash) noexcept
+      -> decltype(self.children_.end()) {
     if (Usable(self)) {
       const ChildIndex& index = self.storage_.index;
       const unsigned char tag = Tag(hash);
@@ -289,13 +298,8 @@ struct Property::Internals {
   }
 };
 
-std::atomic<std::uint64_t> Property::Internals::rename_epoch{0};
-
 Property::Property(const std::string& name)
-    : name_(name),
-      name_hash_(Internals::Hash(name)),
-      type_(PropertyTypeContainer),
-      indexed_(false) {}
+    : name_(name), name_hash_(Hash(name)), type_(PropertyTypeContainer), indexed_(false) {}
 
 Property::Property(const std::string& name, bool value) : Property(name) {
   storage_.flag = value;
@@ -336,7 +340,7 @@ Property::Property(Property&& other) noexcept
   children_.swap(other.children_);
   Internals::MoveValue(*this, other);
   other.name_.clear();
-  other.name_hash_ = Internals::Hash(other.name_);
+  other.name_hash_ = Hash(other.name_);
   if (other.indexed_) Internals::NoteRename();
 }
 
@@ -414,6 +418,22 @@ const Property& Property::operator[](const std::string& key) const {
   return *found;
 }
 
+bool Property::ChildExists(const PropertyKey& key) const noexcept {
+  return Internals::Find(*this, key.name_, key.hash_) != children_.end();
+}
+
+Property::const_iterator Property::FindChild(const PropertyKey& key) const noexcept {
+  return Internals::Find(*this, key.name_, key.hash_);
+}
+
+const Property& Property::operator[](const PropertyKey& key) const {
+  const const_iterator found = Internals::Find(*this, key.name_, key.hash_);
+  if (found == children_.end()) ThrowChildNotFound(key.name_, __LINE__, BOOST_CURRENT_FUNCTION);
+  return *found;
+}
+
+PropertyKey::PropertyKey(const std::string& name) : name_(name), hash_(Hash(name)) {}
+
 Property& Property::operator[](const std::string& key) {
   const iterator found = Internals::Find(*this, key);
   if (found != children_.end()) return *found;
@@ -462,21 +482,6 @@ Property& Property::AdoptLast() noexcept {
   return *last;
 }
 
-bool Property::GetBool() const {
-  if (type_ == PropertyTypeBool) return storage_.flag;
-  ThrowWrongType(PropertyTypeBool, "GetBool", __LINE__, BOOST_CURRENT_FUNCTION);
-}
-
-long long Property::GetInt64() const {
-  if (type_ == PropertyTypeInt64) return storage_.integer;
-  ThrowWrongType(PropertyTypeInt64, "GetInt64", __LINE__, BOOST_CURRENT_FUNCTION);
-}
-
-const std::string& Property::GetString() const {
-  if (type_ == PropertyTypeString) return storage_.text;
-  ThrowWrongType(PropertyTypeString, "GetString", __LINE__, BOOST_CURRENT_FUNCTION);
-}
-
 bool Property::operator==(const Property& other) const noexcept {
   if (type_ != other.type_ || name_hash_ != other.name_hash_ || name_ != other.name_) return false;
   switch (type_) {
@@ -503,11 +508,11 @@ void Property::ThrowNotApplicable(const char* method, int line, const char* func
   ThrowWithLocation(line, __FILE__, function, AddStack(NotApplicableError(method)));
 }
 
-void Property::ThrowWrongType(PropertyTypes requested, const char* method, int line,
-                              const char* function) const {
+void Property::ThrowWrongType(PropertyTypes requested, const char* method, const char* file,
+                              int line, const char* function) const {
   const PropertyTypes actual = GetType();
   ThrowWithLocation(
-      line, __FILE__, function,
+      line, file, function,
       AddStack(WrongPropertyType()
                << PropertyException::PropertyNameInfo(name_)
                << PropertyException::PropertyTypeInfo(actual)
