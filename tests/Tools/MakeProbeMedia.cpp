@@ -26,7 +26,7 @@ extern "C" {
 namespace {
 
 // What a synthetic picture shows: a flat grey picture costs almost nothing to encode, a moving
-// gradient with a little grain a moderate amount, noise as much as the quantiser allows.
+// gradient with a little grain a moderate amount, noise as much as it is given.
 enum class Picture { Flat, Grainy, Noise };
 
 struct VideoStream {
@@ -37,8 +37,7 @@ struct VideoStream {
   AVRational frameRate{25, 1};
   int frames = 0;
   Picture picture = Picture::Grainy;
-  int quantiser = 0;            // fixed quantiser (1 = finest, 31 = coarsest) when not 0
-  std::int64_t bitrate = 0;     // rate-control target when no quantiser is given
+  std::int64_t bitrate = 0;     // the rate control's target; a flat picture stays far below it
   bool withoutPackets = false;  // declared in the header, but no picture is written
 };
 
@@ -72,23 +71,13 @@ struct MediaFile {
 // The header of the styled subtitles: what a demuxer gives as their extradata.
 const char kAssHeader[] =
     "[Script Info]\n"
-    "ScriptType: v4.00+\n"
-    "PlayResX: 384\n"
-    "PlayResY: 288\n"
-    "\n"
-    "[V4+ Styles]\n"
-    "Format: Name, Fontname, Fontsize, PrimaryColour, SecondaryColour, OutlineColour, BackColour, "
-    "Bold, Italic, Underline, StrikeOut, ScaleX, ScaleY, Spacing, Angle, BorderStyle, Outline, "
-    "Shadow, Alignment, MarginL, MarginR, MarginV, Encoding\n"
-    "Style: Default,Arial,16,&Hffffff,&Hffffff,&H0,&H0,0,0,0,0,100,100,0,0,1,1,0,2,10,10,10,0\n"
-    "\n"
-    "[Events]\n"
-    "Format: Layer, Start, End, Style, Name, MarginL, MarginR, MarginV, Effect, Text\n";
+    "Title: Interview\n"
+    "ScriptType: v4.00+\n";
 
 // The files, by what the tests check with them:
 // - two sizes of MPEG-4 video with non-square pixels; one stream encoded well below the presets'
-//   range (a flat picture at the coarsest quantiser), one inside it (rate control aiming at the
-//   range's default), one well above it (noise at the finest quantiser);
+//   range (a flat picture, which needs almost nothing), one inside it (aiming at the range's
+//   default), one well above it (noise at a bitrate twelve times the range's maximum);
 // - AC-3 in mono, stereo and 5.1, PCM in mono, stereo and 5.1, some with a language;
 // - styled subtitles with language, title and header beside a font attachment;
 // - a transport stream whose video stream has no packet, so its picture size cannot be known.
@@ -98,7 +87,7 @@ std::vector<MediaFile> Files() {
   sd.height = 576;
   sd.pixelAspect = {64, 45};
   sd.frameRate = {25, 1};
-  sd.frames = 50;
+  sd.frames = 25;
   sd.bitrate = 3400000;
 
   VideoStream low;
@@ -108,12 +97,12 @@ std::vector<MediaFile> Files() {
   low.frameRate = {30000, 1001};
   low.frames = 30;
   low.picture = Picture::Flat;
-  low.quantiser = 31;
+  low.bitrate = 100000;
 
   VideoStream high = low;
-  high.frames = 15;
+  high.frames = 10;
   high.picture = Picture::Noise;
-  high.quantiser = 4;
+  high.bitrate = 20000000;
 
   AudioStream surround;
   surround.layout = AV_CH_LAYOUT_5POINT1;
@@ -272,12 +261,7 @@ void ConfigureVideo(AVCodecContext& encoder, const void* spec) {
   encoder.pix_fmt = AV_PIX_FMT_YUV420P;
   encoder.gop_size = 12;
   encoder.max_b_frames = 0;
-  if (video.quantiser != 0) {
-    encoder.flags |= AV_CODEC_FLAG_QSCALE;
-    encoder.global_quality = FF_QP2LAMBDA * video.quantiser;
-  } else {
-    encoder.bit_rate = video.bitrate;
-  }
+  encoder.bit_rate = video.bitrate;
 }
 
 void AddVideo(AVFormatContext& output, const VideoStream& video, std::vector<Track>& tracks) {

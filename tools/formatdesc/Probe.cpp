@@ -73,9 +73,14 @@ void SetExtradata(IFormatCodec& codec, const AVCodecParameters& parameters) {
   }
 }
 
-// The settings every kind takes from the codec parameters: identifier, tag and bitrate.
+// The settings every kind takes from the codec parameters: identifier (with libavcodec's long
+// name of the codec, where a new description would say "Unknown codec"), tag and bitrate.
 void SetCodec(IFormatCodec& codec, const AVCodecParameters& parameters, bool withBitrate) {
   codec.SetCodecID(avcodec_get_name(parameters.codec_id));
+  const AVCodecDescriptor* descriptor = avcodec_descriptor_get(parameters.codec_id);
+  if (descriptor != nullptr && descriptor->long_name != nullptr) {
+    codec.SetCodecName(descriptor->long_name);
+  }
   if (parameters.codec_tag != 0) codec.SetCodecTag(parameters.codec_tag);
   if (withBitrate && parameters.bit_rate > 0) codec.SetBitrate(parameters.bit_rate);
 }
@@ -405,7 +410,7 @@ std::string VerdictText(const Verdict& verdict) {
   if (verdict.placement == Placement::Within) return "within the range";
   const bool below = verdict.placement == Placement::Below;
   char share[32];
-  if (verdict.percent < 0.5) {
+  if (verdict.percent < 1.0) {
     std::snprintf(share, sizeof share, "less than 1%%");
   } else {
     std::snprintf(share, sizeof share, "%.0f%%", verdict.percent);
