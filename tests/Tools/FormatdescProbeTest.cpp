@@ -188,7 +188,7 @@ TEST_F(FormatdescProbeStream, UnknownVideoValuesStayUnset) {
   EXPECT_FALSE(report.range);
   EXPECT_FALSE(report.verdict);
   EXPECT_EQ(report.noVerdict,
-            "no range: the presets need the frame rate, which the file does not give");
+            "none (the presets need the frame rate, which the file does not give)");
 }
 
 TEST_F(FormatdescProbeStream, NoBitrateInTheFileGivesRangeWithoutVerdict) {
@@ -198,7 +198,7 @@ TEST_F(FormatdescProbeStream, NoBitrateInTheFileGivesRangeWithoutVerdict) {
   EXPECT_FALSE(report.description->ExistsCodecTag());
   EXPECT_TRUE(report.range);
   EXPECT_FALSE(report.verdict);
-  EXPECT_EQ(report.noVerdict, "no verdict: the file gives no bitrate for this stream");
+  EXPECT_EQ(report.noVerdict, "none (the file gives no bitrate for this stream)");
 }
 
 TEST_F(FormatdescProbeStream, CodecWithoutPresetKeepsItsDescription) {
@@ -298,7 +298,8 @@ TEST_F(FormatdescProbeStream, PresetsRefusingTheLayoutKeepTheDescription) {
   ASSERT_TRUE(report.description);
   EXPECT_TRUE(report.damage.empty());
   EXPECT_FALSE(report.verdict);
-  EXPECT_EQ(report.noVerdict.rfind("no range: ", 0), 0u) << report.noVerdict;
+  EXPECT_EQ(report.noVerdict.rfind("none (the presets refuse the description: ", 0), 0u)
+      << report.noVerdict;
 }
 
 TEST_F(FormatdescProbeStream, StyledSubtitleHeaderIsBothHeaderAndPrivateData) {

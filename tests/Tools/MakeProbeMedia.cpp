@@ -79,7 +79,8 @@ const char kAssHeader[] =
 //   range (a flat picture, which needs almost nothing), one inside it (aiming at the range's
 //   default), one well above it (noise at a bitrate twelve times the range's maximum);
 // - AC-3 in mono, stereo and 5.1, PCM in mono, stereo and 5.1, some with a language;
-// - styled subtitles with language, title and header beside a font attachment;
+// - styled subtitles with language, title and header beside a font attachment, and beside video
+//   whose container gives no bitrate;
 // - a transport stream whose video stream has no packet, so its picture size cannot be known.
 std::vector<MediaFile> Files() {
   VideoStream sd;
@@ -127,6 +128,9 @@ std::vector<MediaFile> Files() {
   ac3Stereo.bitrate = 192000;
   ac3Stereo.language = "fre";
 
+  VideoStream brief = low;
+  brief.frames = 10;
+
   VideoStream unseen = sd;
   unseen.withoutPackets = true;
 
@@ -138,7 +142,7 @@ std::vector<MediaFile> Files() {
       {"surround.ac3", {}, {surround}, {}, {}},
       {"stereo.wav", {}, {pcmStereo}, {}, {}},
       {"surround.wav", {}, {pcmSurround}, {}, {}},
-      {"subtitles.mkv", {}, {ac3Stereo}, {{"ger", "Director's commentary"}}, {{"font.ttf"}}},
+      {"subtitles.mkv", {brief}, {ac3Stereo}, {{"ger", "Director's commentary"}}, {{"font.ttf"}}},
       {"damaged.ts", {unseen}, {ac3Stereo}, {}, {}},
   };
 }

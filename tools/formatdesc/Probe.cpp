@@ -265,16 +265,16 @@ void Judge(StreamReport& report, const AVCodecParameters& parameters) {
     return;
   } catch (const Tarvek::Core::ChildNotFound& e) {
     const std::string* key = boost::get_error_info<Tarvek::Core::ChildNotFound::ChildNameInfo>(e);
-    report.noVerdict = "no range: the presets need the " +
+    report.noVerdict = "none (the presets need the " +
                        SettingPhrase(key != nullptr ? *key : std::string("setting")) +
-                       ", which the file does not give";
+                       ", which the file does not give)";
     return;
   } catch (const Tarvek::Exception& e) {
-    report.noVerdict = "no range: " + LibraryText(e);
+    report.noVerdict = "none (the presets refuse the description: " + LibraryText(e) + ")";
     return;
   }
   if (!report.description->ExistsBitrate()) {
-    report.noVerdict = "no verdict: the file gives no bitrate for this stream";
+    report.noVerdict = "none (the file gives no bitrate for this stream)";
     return;
   }
   report.verdict = JudgeBitrate(report.description->GetBitrate(), *report.range);

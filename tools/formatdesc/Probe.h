@@ -64,8 +64,9 @@ struct StreamReport {
   std::optional<Bitrates> range;
   /// The stream's own bitrate against `range`, when both are known.
   std::optional<Verdict> verdict;
-  /// Instead of a verdict, why there is none: "no preset for codec X", a setting the presets
-  /// need that the file does not give, or no bitrate in the file. Empty for other kinds.
+  /// Instead of a verdict, "no preset for codec X", or "none (...)" saying why: a setting the
+  /// presets need that the file does not give, their refusal, or no bitrate in the file. Empty
+  /// for other kinds.
   std::string noVerdict;
 
   bool Skipped() const { return description == nullptr && damage.empty(); }
