@@ -9,6 +9,9 @@
 //     the output of the arguments (which ask for --json) parses, and each assertion holds:
 //     "/json/pointer=VALUE" (a string value equals VALUE, any other value's JSON text does) or
 //     "!/json/pointer" (no such member: a setting left unset);
+//   FormatdescCheck probeback TOOL MEDIA...
+//     each description probe --json gives for the media files, stored in a file, is read back by
+//     the subcommand of its kind with --from-json: same kind, same tree, same private data;
 //   FormatdescCheck survives TOOL FILE...
 //     probe reads damaged copies of each media file (cut short at seven points, and with bytes
 //     overwritten at eight places) without crashing: every run ends with status 0 or 1 and
@@ -188,6 +191,47 @@ int CheckValues(const std::string& tool, const std::vector<std::string>& argumen
   return failures == 0 ? 0 : Fail(std::to_string(failures) + " assertions failed");
 }
 
+int CheckProbeBack(const std::string& tool, const std::vector<std::string>& media) {
+  int described = 0;
+  int failures = 0;
+  const std::string file = "probeback-" + std::to_string(getpid()) + ".json";
+  for (const std::string& path : media) {
+    const Json probed =
+        Json::parse(Capture(Quote(tool) + " probe " + Quote(path) + " --json"), nullptr, false);
+    if (probed.is_discarded()) return Fail("probe " + path + " --json is not JSON");
+    for (const Json& stream : probed.value("streams", Json::array())) {
+      if (!stream.contains("description")) continue;
+      ++described;
+      const Json& description = stream["description"];
+      std::ofstream(file) << description.dump();
+      const std::string kind = description.value("kind", "?");
+      // Without the bitrates: a probed video description has no bitrate mode, and an audio one
+      // may have no layout.
+      const Json back =
+          Json::parse(Capture(Quote(tool) + ' ' + kind + " --from-json " + file +
+                              (kind == "subtitle" ? "" : " --no-bitrate") + " --json"),
+                      nullptr, false);
+      const std::string where = path + " stream " + std::to_string(stream.value("index", -1));
+      if (back.is_discarded()) {
+        ++failures;
+        std::cerr << "FormatdescCheck: " << where << ": not read back\n";
+        continue;
+      }
+      for (const char* member : {"kind", "tree", "private_data"}) {
+        if (description.contains(member) != back.contains(member) ||
+            (description.contains(member) && description[member] != back[member])) {
+          ++failures;
+          std::cerr << "FormatdescCheck: " << where << ": " << member
+                    << " differs when read back\n";
+        }
+      }
+    }
+  }
+  std::remove(file.c_str());
+  if (described == 0) return Fail("no stream was described");
+  return failures == 0 ? 0 : Fail(std::to_string(failures) + " differences");
+}
+
 // The same bytes on every run, unlike rand().
 std::uint32_t NextRandom(std::uint32_t& state) {
   state = state * 1664525u + 1013904223u;
@@ -298,11 +342,15 @@ int main(int argc, char** argv) {
         args[1], std::vector<std::string>(args.begin() + 2, separator),
         std::vector<std::string>(separator == args.end() ? args.end() : separator + 1, args.end()));
   }
+  if (args.size() >= 3 && args[0] == "probeback") {
+    return CheckProbeBack(args[1], std::vector<std::string>(args.begin() + 2, args.end()));
+  }
   if (args.size() >= 3 && args[0] == "survives") {
     return CheckSurvives(args[1], std::vector<std::string>(args.begin() + 2, args.end()));
   }
   if (args.size() == 3 && args[0] == "readme") return CheckReadme(args[1], args[2]);
   return Fail(
       "usage: FormatdescCheck json TOOL ARGUMENT... | fromjson TOOL SUBCOMMAND ARGUMENT... | "
-      "values TOOL ARGUMENT... -- ASSERTION... | survives TOOL FILE... | readme TOOL README");
+      "values TOOL ARGUMENT... -- ASSERTION... | probeback TOOL MEDIA... | survives TOOL FILE... | "
+      "readme TOOL README");
 }
