@@ -171,7 +171,7 @@ TEST_F(FormatdescProbeStream, CodecPixelAspectStandsInForTheContainers) {
 TEST_F(FormatdescProbeStream, UnknownVideoValuesStayUnset) {
   AVStream& stream = NewVideo(AV_CODEC_ID_MPEG4, 640, 480);
   stream.avg_frame_rate = AVRational{0, 0};
-  stream.codecpar->format = AV_PIX_FMT_NONE;
+  stream.codecpar->format = AV_PIX_FMT_NB;  // beyond libavutil's formats, as a bad file may say
   stream.codecpar->bit_rate = 800000;
 
   const StreamReport report = DescribeStream(stream);
@@ -277,6 +277,18 @@ TEST_F(FormatdescProbeStream, UnorderedChannelsLeaveLayoutUnsetAndRangeUsesUsual
   EXPECT_EQ(report.range->minimum, 1536000);  // 48000 Hz x 2 channels x 16 bits
   ASSERT_TRUE(report.verdict);
   EXPECT_EQ(report.verdict->placement, Placement::Within);
+}
+
+TEST_F(FormatdescProbeStream, UnknownSampleFormatStaysUnset) {
+  AVStream& stream = NewAudio(AV_CODEC_ID_FLAC, AV_CH_LAYOUT_STEREO);
+  stream.codecpar->format = AV_SAMPLE_FMT_NONE;
+  stream.codecpar->bit_rate = 900000;
+  const StreamReport report = DescribeStream(stream);
+  EXPECT_FALSE(As<IFormatCodecAudio>(report)->ExistsSampleFormat());
+  EXPECT_EQ(report.notes,
+            std::vector<std::string>{"the sample format is unknown, so it is left unset"});
+  EXPECT_EQ(report.noVerdict,
+            "none (the presets need the sample format, which the file does not give)");
 }
 
 TEST_F(FormatdescProbeStream, MaskBeyondThirtyTwoSpeakersStaysUnset) {

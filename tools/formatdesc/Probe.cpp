@@ -13,7 +13,6 @@ extern "C" {
 }
 
 #include <boost/exception/get_error_info.hpp>
-#include <cerrno>
 #include <cmath>
 #include <cstdarg>
 #include <cstdio>
@@ -139,7 +138,7 @@ void DescribeVideo(const AVStream& stream, StreamReport& report) {
   } else {
     report.notes.push_back("the average frame rate is unknown, so it is left unset");
   }
-  if (parameters.format >= 0) {
+  if (parameters.format >= 0 && parameters.format < AV_PIX_FMT_NB) {
     video->SetPixelFormat(static_cast<AVPixelFormat>(parameters.format));
   } else {
     report.notes.push_back("the pixel format is unknown, so it is left unset");
@@ -212,7 +211,7 @@ void DescribeAudio(const AVStream& stream, StreamReport& report) {
     audio->SetChannelLayout(*mask);
   }
   if (parameters.frame_size > 0) audio->SetFrameSize(parameters.frame_size);
-  if (parameters.format >= 0) {
+  if (parameters.format >= 0 && parameters.format < AV_SAMPLE_FMT_NB) {
     audio->SetSampleFormat(static_cast<AVSampleFormat>(parameters.format));
   } else {
     report.notes.push_back("the sample format is unknown, so it is left unset");
