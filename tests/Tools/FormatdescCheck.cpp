@@ -5,13 +5,27 @@
 //   FormatdescCheck fromjson TOOL SUBCOMMAND ARGUMENT...
 //     the --json output of SUBCOMMAND ARGUMENT..., stored in a file and read back with
 //     SUBCOMMAND --from-json, gives the same output again, as JSON and as text;
+//   FormatdescCheck values TOOL ARGUMENT... -- ASSERTION...
+//     the output of the arguments (which ask for --json) parses, and each assertion holds:
+//     "/json/pointer=VALUE" (a string value equals VALUE, any other value's JSON text does) or
+//     "!/json/pointer" (no such member: a setting left unset);
+//   FormatdescCheck probeback TOOL MEDIA...
+//     each description probe --json gives for the media files, stored in a file, is read back by
+//     the subcommand of its kind with --from-json: same kind, same tree, same private data;
+//   FormatdescCheck survives TOOL FILE...
+//     probe reads damaged copies of each media file (cut short at seven points, and with bytes
+//     overwritten at eight places) without crashing: every run ends with status 0 or 1 and
+//     nothing on standard error, or with one "formatdesc: " line on it (status 1 or 2);
 //   FormatdescCheck readme TOOL README
 //     every console block of the README's formatdesc section ("$ formatdesc ..." then the
 //     output) prints what it shows; with FORMATDESC_UPDATE_EXPECTED set, the blocks are
 //     rewritten with what the tool prints instead.
 // The tool runs through the shell (popen), so README commands are read as a user's shell would.
+#include <sys/wait.h>
 #include <unistd.h>
+#include <algorithm>
 #include <cmath>
+#include <cstdint>
 #include <cstdio>
 #include <cstdlib>
 #include <fstream>
@@ -143,6 +157,139 @@ int CheckFromJson(const std::string& tool, const std::vector<std::string>& argum
   return 0;
 }
 
+int CheckValues(const std::string& tool, const std::vector<std::string>& arguments,
+                const std::vector<std::string>& assertions) {
+  std::string command = Quote(tool);
+  for (const std::string& argument : arguments) command += ' ' + Quote(argument);
+  const Json json = Json::parse(Capture(command), nullptr, false);
+  if (json.is_discarded()) return Fail("output is not JSON");
+  int failures = 0;
+  for (const std::string& assertion : assertions) {
+    const bool absent = assertion.rfind('!', 0) == 0;
+    const std::size_t equals = assertion.find('=');
+    const std::string pointer =
+        absent ? assertion.substr(1)
+               : assertion.substr(0, equals == std::string::npos ? assertion.size() : equals);
+    const Json::json_pointer at(pointer);
+    std::string problem;
+    if (absent) {
+      if (json.contains(at)) problem = "present, holding " + json.at(at).dump();
+    } else if (equals == std::string::npos) {
+      problem = "an assertion needs =VALUE";
+    } else if (!json.contains(at)) {
+      problem = "missing";
+    } else {
+      const Json& value = json.at(at);
+      const std::string actual = value.is_string() ? value.get<std::string>() : value.dump();
+      if (actual != assertion.substr(equals + 1)) problem = "holds " + actual;
+    }
+    if (!problem.empty()) {
+      ++failures;
+      std::cerr << "FormatdescCheck: " << assertion << ": " << problem << '\n';
+    }
+  }
+  return failures == 0 ? 0 : Fail(std::to_string(failures) + " assertions failed");
+}
+
+int CheckProbeBack(const std::string& tool, const std::vector<std::string>& media) {
+  int described = 0;
+  int failures = 0;
+  const std::string file = "probeback-" + std::to_string(getpid()) + ".json";
+  for (const std::string& path : media) {
+    const Json probed =
+        Json::parse(Capture(Quote(tool) + " probe " + Quote(path) + " --json"), nullptr, false);
+    if (probed.is_discarded()) return Fail("probe " + path + " --json is not JSON");
+    for (const Json& stream : probed.value("streams", Json::array())) {
+      if (!stream.contains("description")) continue;
+      ++described;
+      const Json& description = stream["description"];
+      std::ofstream(file) << description.dump();
+      const std::string kind = description.value("kind", "?");
+      // Without the bitrates: a probed video description has no bitrate mode, and an audio one
+      // may have no layout.
+      const Json back =
+          Json::parse(Capture(Quote(tool) + ' ' + kind + " --from-json " + file +
+                              (kind == "subtitle" ? "" : " --no-bitrate") + " --json"),
+                      nullptr, false);
+      const std::string where = path + " stream " + std::to_string(stream.value("index", -1));
+      if (back.is_discarded()) {
+        ++failures;
+        std::cerr << "FormatdescCheck: " << where << ": not read back\n";
+        continue;
+      }
+      for (const char* member : {"kind", "tree", "private_data"}) {
+        if (description.contains(member) != back.contains(member) ||
+            (description.contains(member) && description[member] != back[member])) {
+          ++failures;
+          std::cerr << "FormatdescCheck: " << where << ": " << member
+                    << " differs when read back\n";
+        }
+      }
+    }
+  }
+  std::remove(file.c_str());
+  if (described == 0) return Fail("no stream was described");
+  return failures == 0 ? 0 : Fail(std::to_string(failures) + " differences");
+}
+
+// The same bytes on every run, unlike rand().
+std::uint32_t NextRandom(std::uint32_t& state) {
+  state = state * 1664525u + 1013904223u;
+  return state >> 8;
+}
+
+// Runs the probe on `file` and returns what is wrong with how it ended, or "".
+std::string ProbeEnding(const std::string& tool, const std::string& file, bool json) {
+  const std::string errors = "survives-" + std::to_string(getpid()) + ".err";
+  const std::string command = Quote(tool) + " probe " + Quote(file) + (json ? " --json" : "") +
+                              " >/dev/null 2>" + Quote(errors);
+  const int raw = std::system(command.c_str());
+  std::ifstream in(errors);
+  const std::string said((std::istreambuf_iterator<char>(in)), std::istreambuf_iterator<char>());
+  std::remove(errors.c_str());
+  if (raw == -1 || !WIFEXITED(raw)) return "did not exit normally";
+  const int status = WEXITSTATUS(raw);
+  const bool oneLine = said.rfind("formatdesc: ", 0) == 0 && said.find('\n') == said.size() - 1;
+  if (status == 2 && oneLine) return "";
+  if ((status == 0 || status == 1) && (said.empty() || oneLine)) return "";
+  return "exit status " + std::to_string(status) + ", standard error:\n" + said;
+}
+
+int CheckSurvives(const std::string& tool, const std::vector<std::string>& files) {
+  int failures = 0;
+  std::uint32_t state = 2024;
+  for (const std::string& file : files) {
+    std::ifstream in(file, std::ios::binary);
+    const std::string bytes((std::istreambuf_iterator<char>(in)), std::istreambuf_iterator<char>());
+    if (bytes.size() < 64) return Fail(file + " is missing or too short to damage");
+    std::vector<std::string> copies;
+    for (std::size_t eighth = 1; eighth < 8; ++eighth) {
+      copies.push_back(bytes.substr(0, bytes.size() * eighth / 8));
+    }
+    for (int place = 0; place < 8; ++place) {
+      std::string copy = bytes;
+      const std::size_t at = NextRandom(state) % (copy.size() - 16);
+      for (std::size_t i = at; i < at + 16; ++i) copy[i] = static_cast<char>(NextRandom(state));
+      copies.push_back(copy);
+    }
+    const std::string name = file.substr(file.find_last_of('/') + 1);
+    for (std::size_t i = 0; i < copies.size(); ++i) {
+      const std::string copy = "damaged-" + std::to_string(i) + "-" + name;
+      std::ofstream(copy, std::ios::binary) << copies[i];
+      for (const bool json : {false, true}) {
+        const std::string problem = ProbeEnding(tool, copy, json);
+        if (!problem.empty()) {
+          ++failures;
+          std::cerr << "FormatdescCheck: probe " << copy << (json ? " --json" : "") << ": "
+                    << problem << '\n';
+        }
+      }
+      std::remove(copy.c_str());
+    }
+  }
+  return failures == 0 ? 0 : Fail(std::to_string(failures) + " damaged files ended badly");
+}
+
 int CheckReadme(const std::string& tool, const std::string& path) {
   std::ifstream in(path);
   std::string readme((std::istreambuf_iterator<char>(in)), std::istreambuf_iterator<char>());
@@ -189,8 +336,21 @@ int main(int argc, char** argv) {
   if (args.size() >= 3 && args[0] == "fromjson") {
     return CheckFromJson(args[1], std::vector<std::string>(args.begin() + 2, args.end()));
   }
+  if (args.size() >= 3 && args[0] == "values") {
+    const auto separator = std::find(args.begin() + 2, args.end(), "--");
+    return CheckValues(
+        args[1], std::vector<std::string>(args.begin() + 2, separator),
+        std::vector<std::string>(separator == args.end() ? args.end() : separator + 1, args.end()));
+  }
+  if (args.size() >= 3 && args[0] == "probeback") {
+    return CheckProbeBack(args[1], std::vector<std::string>(args.begin() + 2, args.end()));
+  }
+  if (args.size() >= 3 && args[0] == "survives") {
+    return CheckSurvives(args[1], std::vector<std::string>(args.begin() + 2, args.end()));
+  }
   if (args.size() == 3 && args[0] == "readme") return CheckReadme(args[1], args[2]);
   return Fail(
       "usage: FormatdescCheck json TOOL ARGUMENT... | fromjson TOOL SUBCOMMAND ARGUMENT... | "
+      "values TOOL ARGUMENT... -- ASSERTION... | probeback TOOL MEDIA... | survives TOOL FILE... | "
       "readme TOOL README");
 }

@@ -241,7 +241,8 @@ std::string ReadableFrameRate(double framesPerSecond) {
   return result;
 }
 
-void PrintDescription(IFormatCodec& codec, const std::optional<Bitrates>& bitrates) {
+void PrintDescription(IFormatCodec& codec, const std::optional<Bitrates>& bitrates,
+                      const std::vector<std::pair<std::string, std::string>>& extra) {
   codec.PrintContent();
   auto lines = SummaryLines(Derive(codec), bitrates);
   // Kept outside the tree, so PrintContent does not show it.
@@ -249,6 +250,7 @@ void PrintDescription(IFormatCodec& codec, const std::optional<Bitrates>& bitrat
     const std::size_t size = data->GetSize();
     lines.emplace_back("Private data", std::to_string(size) + (size == 1 ? " byte" : " bytes"));
   }
+  lines.insert(lines.end(), extra.begin(), extra.end());
   if (lines.empty()) return;
   std::cout << "======Summary:=============\n";
   for (const auto& [label, value] : lines) {

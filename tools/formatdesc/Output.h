@@ -9,6 +9,7 @@
 #include <nlohmann/json.hpp>
 #include <optional>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "Describe.h"
@@ -24,8 +25,10 @@ std::string ReadableFrameRate(double framesPerSecond);
 
 /// Prints `codec`'s PrintContent to standard output, then under "======Summary:=============" the
 /// derived values that are set (frame aspect and rate, format and layout names, the size of the
-/// private data) and the bitrates when given, one "Label: value" line each.
-void PrintDescription(Tarvek::Conf::IFormatCodec& codec, const std::optional<Bitrates>& bitrates);
+/// private data) and the bitrates when given, one "Label: value" line each, then the `extra`
+/// lines a caller adds (such as a verdict on the bitrate).
+void PrintDescription(Tarvek::Conf::IFormatCodec& codec, const std::optional<Bitrates>& bitrates,
+                      const std::vector<std::pair<std::string, std::string>>& extra = {});
 
 /// The same as one JSON object: the library's JSON form of the description (ToJson, which
 /// --from-json reads back), then "settings" (the property tree under the description's own

@@ -1,10 +1,10 @@
 // formatdesc: builds a format description from command-line options (or a stored one) and shows
-// it, with the bitrates the presets give for it; compares and validates stored descriptions.
-// This file wires the subcommands and their options and turns every failure into one line on
-// standard error and an exit status:
+// it, with the bitrates the presets give for it; compares and validates stored descriptions;
+// describes the streams of a media file. This file wires the subcommands and their options and
+// turns every failure into one line on standard error and an exit status:
 //   0 success, 1 the library refused (for example a setting the bitrates need is missing, or a
-//   file holds no description) or validate found an error, 2 bad usage (an unknown option, a
-//   value or file that cannot be read).
+//   file holds no description), validate found an error or probe found a damaged stream, 2 bad
+//   usage (an unknown option, a value or file that cannot be read, a file that is not media).
 #include <Tarvek/Formats.h>
 #include <CLI/CLI.hpp>
 
@@ -18,6 +18,7 @@
 #include "Describe.h"
 #include "Options.h"
 #include "Output.h"
+#include "Probe.h"
 
 namespace {
 
@@ -55,6 +56,12 @@ struct ValidateArgs {
 
 constexpr const char* kFromJsonHelp =
     "Start from the description in FILE (as --json writes it); the options change it";
+
+struct ProbeArgs {
+  std::string file;
+  std::optional<std::string> stream;
+  bool json = false;
+};
 
 struct CodecsArgs {
   std::optional<std::string> kind;
@@ -234,6 +241,25 @@ void AddValidate(CLI::App& app, ValidateArgs& args) {
       "for bad usage or a file that cannot be read.");
 }
 
+void AddProbe(CLI::App& app, ProbeArgs& args) {
+  CLI::App* probe =
+      app.add_subcommand("probe", "Describe the streams of a media file, with bitrate verdicts");
+  probe->add_option("file", args.file, "The media file, read with libavformat")
+      ->required()
+      ->type_name("FILE");
+  AddText(*probe, "--stream", args.stream, "Only the stream of this index (0 is the first)", "N");
+  probe->add_flag("--json", args.json, "Print one JSON object instead of text");
+  probe->footer(
+      "Builds a description of every video, audio and subtitle stream from what the file says,\n"
+      "and lists streams of other kinds as skipped. A value the file leaves unknown, such as a\n"
+      "0:1 pixel aspect, stays unset, with a note. For video and audio it gives the presets'\n"
+      "range (video in a target-bitrate mode, as a file holds no quality figure) and whether the\n"
+      "stream's bitrate is below, within or above it and by how much; 'no preset for codec X'\n"
+      "when the presets do not know the codec, or why there is no verdict.\n"
+      "Exit status: 0 on success, 1 when a stream shown is damaged (it is reported, the others\n"
+      "are described), 2 for bad usage or a file that cannot be read or is not media.");
+}
+
 void Show(const boost::intrusive_ptr<Tarvek::Conf::IFormatCodec>& codec,
           const std::optional<Bitrates>& bitrates, bool json) {
   if (json) {
@@ -328,6 +354,32 @@ bool RunValidate(const ValidateArgs& args) {
   });
 }
 
+// True when a stream shown is damaged.
+bool RunProbe(const ProbeArgs& args) {
+  std::optional<long long> only;
+  if (args.stream) {
+    only = ParseNonNegative("--stream", *args.stream, std::numeric_limits<int>::max());
+  }
+  const FileReport report = ProbeFile(args.file);
+  const auto count = static_cast<long long>(report.streams.size());
+  if (only && *only >= count) {
+    throw BadValue(
+        "--stream",
+        "a stream index from 0 to " + std::to_string(count - 1) + " of '" + args.file + "'",
+        *args.stream);
+  }
+  const std::optional<int> shown =
+      only ? std::optional<int>(static_cast<int>(*only)) : std::optional<int>();
+  if (args.json) {
+    PrintJson(std::cout, ProbeJson(args.file, report, shown));
+  } else {
+    PrintProbe(args.file, report, shown);
+  }
+  return std::any_of(report.streams.begin(), report.streams.end(), [&](const StreamReport& s) {
+    return !s.damage.empty() && (!shown || s.index == *shown);
+  });
+}
+
 void RunCodecs(const CodecsArgs& args) {
   if (args.kind && *args.kind != "video" && *args.kind != "audio") {
     throw BadValue("--kind", "video or audio", *args.kind);
@@ -393,7 +445,7 @@ std::string ExtrasMessage(const CLI::App& app) {
 // switch given a value, an unknown or missing subcommand.
 std::string ParseErrorMessage(const CLI::App& app, const CLI::ParseError& e, int argc,
                               char** argv) {
-  const std::string known = "video, audio, subtitle, ladder, codecs, diff or validate";
+  const std::string known = "video, audio, subtitle, ladder, codecs, diff, validate or probe";
   if (std::string(e.what()).find("disallowed flag override") != std::string::npos) {
     return SwitchValueMessage(argc, argv);
   }
@@ -411,14 +463,14 @@ std::string ParseErrorMessage(const CLI::App& app, const CLI::ParseError& e, int
 int Run(int argc, char** argv) {
   CLI::App app(
       "Builds a media format description from options and shows it; compares and checks stored "
-      "ones.",
+      "ones; describes the streams of a media file.",
       "formatdesc");
   app.set_version_flag("--version", std::string("formatdesc ") + TARVEK_FORMATS_VERSION);
   app.require_subcommand(1);
   app.footer(
       "Run 'formatdesc SUBCOMMAND --help' for the options of each.\n"
-      "Exit status: 0 on success, 1 when the library refuses the description or validate finds "
-      "an\nerror, 2 for bad usage.");
+      "Exit status: 0 on success, 1 when the library refuses the description, validate finds an\n"
+      "error or probe finds a damaged stream, 2 for bad usage or a file that cannot be read.");
   VideoArgs video;
   AudioArgs audio;
   SubtitleArgs subtitle;
@@ -427,6 +479,7 @@ int Run(int argc, char** argv) {
   CodecsArgs codecs;
   DiffArgs diff;
   ValidateArgs validate;
+  ProbeArgs probe;
   AddVideo(app, video, videoFlags);
   AddAudio(app, audio, audioFlags);
   AddSubtitle(app, subtitle, subtitleFlags);
@@ -434,6 +487,7 @@ int Run(int argc, char** argv) {
   AddCodecs(app, codecs);
   AddDiff(app, diff);
   AddValidate(app, validate);
+  AddProbe(app, probe);
   try {
     app.parse(argc, argv);
   } catch (const CLI::ParseError& e) {
@@ -450,7 +504,8 @@ int Run(int argc, char** argv) {
   if (name == "ladder") RunLadder(ladder);
   if (name == "codecs") RunCodecs(codecs);
   if (name == "diff") RunDiff(diff);
-  const bool invalid = name == "validate" && RunValidate(validate);
+  const bool invalid =
+      (name == "validate" && RunValidate(validate)) || (name == "probe" && RunProbe(probe));
   if (!std::cout.flush()) return Fail("cannot write to standard output", kLibraryError);
   return invalid ? kLibraryError : 0;
 }

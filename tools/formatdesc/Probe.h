@@ -1,0 +1,113 @@
+// formatdesc probe: the streams of a media file, read with libavformat, as descriptions built
+// through the library's public interfaces, and a verdict on each stream's bitrate against the
+// range the presets give for it. Only the tool links libavformat; the library never sees it.
+#ifndef TARVEK_TOOLS_FORMATDESC_PROBE_H_
+#define TARVEK_TOOLS_FORMATDESC_PROBE_H_
+
+#include <Tarvek/Formats.h>
+
+#include <iosfwd>
+#include <nlohmann/json.hpp>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "Describe.h"
+
+struct AVStream;
+
+namespace Formatdesc {
+
+/// Where a bitrate lies against the presets' minimum to maximum.
+enum class Placement { Below, Within, Above };
+
+/// "below", "within" or "above".
+const char* PlacementName(Placement placement);
+
+/// A bitrate judged against a range, all in bits per second.
+struct Verdict {
+  Placement placement = Placement::Within;
+  long long bitrate = 0;
+  /// The bound passed: the minimum when below, the maximum when above; 0 within the range.
+  long long bound = 0;
+  /// How far past the bound, always positive outside the range; 0 within it.
+  long long difference = 0;
+  /// `difference` as a share of `bound`, in per cent.
+  double percent = 0.0;
+};
+
+/// `bitrate` against `range`: within from range.minimum to range.maximum, both included.
+Verdict JudgeBitrate(long long bitrate, const Bitrates& range);
+
+/// "within the range", or how far outside and which bound, in the tool's bitrate units:
+/// "below the range by 62% (1.98 Mb/s under the minimum of 3.20 Mb/s)",
+/// "above the range by 150% (3.00 Mb/s over the maximum of 2.00 Mb/s)"; a share under one per
+/// cent reads "less than 1%".
+std::string VerdictText(const Verdict& verdict);
+
+/// What the probe made of one stream of a file.
+struct StreamReport {
+  int index = 0;
+  /// libavutil's name of the stream's media kind: "video", "audio", "subtitle", "data",
+  /// "attachment", or "unknown".
+  std::string kind;
+  /// FFmpeg's name of the stream's codec ("none" when libavformat does not know it).
+  std::string codec;
+  /// The description; null for a stream of another kind (skipped) or a damaged one.
+  boost::intrusive_ptr<Tarvek::Conf::IFormatCodec> description;
+  /// Why a video, audio or subtitle stream could not be described; empty when it was.
+  std::string damage;
+  /// Values the file does not give, or gives in a form the library cannot hold, and that the
+  /// description therefore leaves unset, one sentence each.
+  std::vector<std::string> notes;
+  /// The presets' bitrates for a video or audio description, when they have them.
+  std::optional<Bitrates> range;
+  /// The stream's own bitrate against `range`, when both are known.
+  std::optional<Verdict> verdict;
+  /// Instead of a verdict, "no preset for codec X", or "none (...)" saying why: a setting the
+  /// presets need that the file does not give, their refusal, or no bitrate in the file. Empty
+  /// for other kinds.
+  std::string noVerdict;
+
+  bool Skipped() const { return description == nullptr && damage.empty(); }
+};
+
+/// The report of `stream`: for video, audio and subtitle streams the description (codec
+/// identifier, tag, bitrate, geometry or sample layout, language, title, header, DVB size, and
+/// the codec's extradata as private data), the notes, and for video and audio the range and the
+/// verdict. Values the stream leaves unknown (a zero size or rate, a 0:1 pixel aspect, a channel
+/// order that is not a speaker mask) stay unset; a stream without a size, sample rate, channel
+/// count or known codec is damaged. Throws only std::bad_alloc.
+StreamReport DescribeStream(const AVStream& stream);
+
+/// What the probe made of a file.
+struct FileReport {
+  /// libavformat's name of the container ("QuickTime / MOV").
+  std::string container;
+  std::vector<StreamReport> streams;
+};
+
+/// Opens the file at `path` (a local file, never a network address or another protocol) and
+/// reports every stream. Throws UsageError, with libavformat's reason, for a file that cannot be
+/// opened or read, that libavformat does not recognise as media, or that holds no stream. A
+/// damaged stream is reported, not thrown. libavformat's own messages are kept off the
+/// terminal while it runs.
+FileReport ProbeFile(const std::string& path);
+
+/// Prints a line naming `path`, its container and its stream count, then each stream of
+/// `report` (only stream `only` when given): a heading line "Stream N: kind (codec)", then the
+/// description as the other subcommands print it with the bitrate verdict and the notes in its
+/// summary; a damaged or skipped stream is the heading line alone, saying why.
+void PrintProbe(const std::string& path, const FileReport& report, std::optional<int> only);
+
+/// The same as one JSON object: "file", "container" and "streams", each stream with "index",
+/// "kind", "codec", "status" ("described", "damaged" or "skipped") and, as they apply,
+/// "damage", "notes", "description" (in the library's JSON form, with the derived values and
+/// the presets' bitrates, as --json gives for one description) and "verdict" ("result" below,
+/// within, above or none, and "text").
+nlohmann::ordered_json ProbeJson(const std::string& path, const FileReport& report,
+                                 std::optional<int> only);
+
+}  // namespace Formatdesc
+
+#endif  // TARVEK_TOOLS_FORMATDESC_PROBE_H_
