@@ -71,10 +71,12 @@ std::uint32_t Hash(const std::string& name) noexcept {
     a = Load32(data);
     b = Load32(data + size - 4);
   } else {
-    a = size == 0 ? 0 : static_cast<unsigned char>(data[0]);
-    b = size == 0 ? 0
-                  : static_cast<unsigned char>(data[size - 1]) << 8 |
-                        static_cast<unsigned char>(data[size / 2]);
+    // One to three bytes: the first, the middle and the last (0 for the empty name).
+    const auto byte = [data](std::size_t i) {
+      return std::uint64_t{static_cast<unsigned char>(data[i])};
+    };
+    a = size == 0 ? 0 : byte(0);
+    b = size == 0 ? 0 : byte(size - 1) << 8 | byte(size / 2);
   }
   const std::uint64_t h = ((a ^ size) * k0) ^ (b * k1);
   return static_cast<std::uint32_t>(h ^ (h >> 32));
