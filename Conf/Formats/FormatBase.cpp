@@ -1,6 +1,7 @@
 #include "FormatBase.h"
 
 #include <iostream>
+#include <tuple>
 #include <utility>
 
 namespace Tarvek {
@@ -8,9 +9,10 @@ namespace Conf {
 
 FormatBase::FormatBase(const std::string& name) : property_(name) {
   // The key holds no '.', so put() would read it as a path of one top-level entry; push_back adds
-  // that entry without parsing a path.
-  internal_properties_.push_back(
-      boost::property_tree::ptree::value_type(TAG_OBJECT, boost::property_tree::ptree(name)));
+  // that entry without parsing a path, and the entry built in place spares a temporary tree.
+  const boost::property_tree::ptree::value_type entry(
+      std::piecewise_construct, std::forward_as_tuple(TAG_OBJECT), std::forward_as_tuple(name));
+  internal_properties_.push_back(entry);
   property_.SetChild(TAG_METADATA);
 }
 

@@ -13,9 +13,8 @@
 //
 // Reading. The const operator[] never changes the tree: a missing child throws ChildNotFound,
 // and a typed getter on a node of another type throws WrongPropertyType. Test with ChildExists
-// first where absence is normal; the errors carry the names involved and the call stack. A
-// look-up compares a stored hash of each name before its text, and large containers keep an
-// index of their children, so it costs a few nanoseconds whatever the number of children.
+// first where absence is normal. Large containers keep an index of their children by a hash of
+// the name, so a look-up costs a few nanoseconds whatever the number of children.
 // Writing. SetChildT overwrites the first child of a name in place or appends one; CreateChildT
 // always appends. SetChild does the same for whole sub-trees. The non-const operator[] appends
 // an empty container child when the name is missing, so use it only to write.
@@ -29,7 +28,9 @@
 #ifndef TARVEK_CORE_INTERFACES_PROPERTY_H_
 #define TARVEK_CORE_INTERFACES_PROPERTY_H_
 
+#include <atomic>
 #include <cstdint>
+#include <cstring>
 #include <iosfwd>
 #include <list>
 #include <string>
@@ -110,9 +111,9 @@ class TARVEK_CORE_API Property {
   /// none.
   const Property& operator[](const std::string& key) const;
   /// The same three look-ups by a PropertyKey, for names looked up again and again.
-  bool ChildExists(const PropertyKey& key) const noexcept;
-  const_iterator FindChild(const PropertyKey& key) const noexcept;
-  const Property& operator[](const PropertyKey& key) const;
+  inline bool ChildExists(const PropertyKey& key) const noexcept;
+  inline const_iterator FindChild(const PropertyKey& key) const noexcept;
+  inline const Property& operator[](const PropertyKey& key) const;
   /// The first direct child named `key`, appending an empty container child when there is none.
   /// Throws MethodIsNotApplicable when this node is not a container and has no such child.
   Property& operator[](const std::string& key);
@@ -129,8 +130,7 @@ class TARVEK_CORE_API Property {
   bool GetBool() const;
   /// The value of an int64 leaf. Throws WrongPropertyType for any other type.
   long long GetInt64() const;
-  /// The value of a string leaf, by reference (valid until the node changes). Throws
-  /// WrongPropertyType for any other type.
+  /// A string leaf's value, by reference (valid until the node changes); throws as GetInt64.
   const std::string& GetString() const;
 
   /// Deep equality: same name, type and value, and pairwise equal children in the same order.
@@ -169,14 +169,16 @@ class TARVEK_CORE_API Property {
     ChildIndex index;
   };
 
-  // Indexes the child just appended and returns it. Never throws.
-  Property& AdoptLast() noexcept;
+  static std::atomic<std::uint64_t> rename_epoch_;  // see Property.cpp
+  Property& AdoptLast() noexcept;  // indexes the child just appended and returns it
+  // The first child named `name` by walking the children, or their end.
+  const_iterator ScanChildren(const std::string& name, std::uint32_t hash) const noexcept;
   // The refusal of the child helpers, with the items naming this node and `method` attached.
   MethodIsNotApplicable NotApplicableError(const char* method) const;
   [[noreturn]] void ThrowNotApplicable(const char* method, int line, const char* function) const;
   [[noreturn]] void ThrowWrongType(PropertyTypes requested, const char* method, const char* file,
                                    int line, const char* function) const;
-  [[noreturn]] void ThrowChildNotFound(const std::string& key, int line,
+  [[noreturn]] void ThrowChildNotFound(const std::string& key, const char* file, int line,
                                        const char* function) const;
 
   std::string name_;
@@ -228,12 +230,10 @@ constexpr const char* kPropertyHeader = "Core/Interfaces/Property.h";
 
 }  // namespace Detail
 
-// The typed child helpers are defined here, inline, and their refusals are recorded at the lines
-// of this header on which they throw; keep the two throw statements where they are.
+// The typed child helpers record the lines of their throw statements: keep those where they are.
 // CreateChildT constructs the child in place at the end of the list: nothing is looked up, so a
-// name that is present already gets a second child after the others. If construction fails, the
-// list is left as it was. It is the building block of SetChildT and serves callers that build
-// trees with repeated names, such as lists of entries; a refusal leaves the node as it was.
+// name that is present already gets a second child after the others; if construction fails, the
+// list is left as it was. It serves SetChildT and callers that build lists of repeated names.
 template <class T>
 Property& Property::CreateChildT(const std::string& name, const T& value) {
   if (GetType() != PropertyTypeContainer) {
@@ -312,6 +312,71 @@ class TARVEK_CORE_API PropertyKey {
   std::string name_;
   std::uint32_t hash_;
 };
+
+namespace Detail {
+
+// The index of a container's children (see Property.cpp): `mask` + 1 list iterators, then as many
+// control bytes, 0 for an empty slot, else 0x80 and the top seven bits of the name's hash.
+inline const Property::iterator* IndexSlots(const void* block) noexcept {
+  return static_cast<const Property::iterator*>(block);
+}
+inline const unsigned char* IndexControl(const void* block, std::uint32_t mask) noexcept {
+  return reinterpret_cast<const unsigned char*>(IndexSlots(block) + mask + 1);
+}
+inline unsigned char IndexTag(std::uint32_t hash) noexcept {
+  return static_cast<unsigned char>(0x80u | (hash >> 25));
+}
+
+// Text equality without a library call for names of 4 to 16 bytes, the usual ones.
+inline bool SameName(const std::string& a, const std::string& b) noexcept {
+  const std::size_t size = a.size();
+  if (size != b.size()) return false;
+  const char* x = a.data();
+  const char* y = b.data();
+  const auto same = [x, y](std::size_t at, auto word) {
+    std::memcpy(&word, x + at, sizeof word);
+    decltype(word) other;
+    std::memcpy(&other, y + at, sizeof other);
+    return word == other;
+  };
+  if (size >= 8 && size <= 16) return same(0, std::uint64_t{}) && same(size - 8, std::uint64_t{});
+  if (size >= 4 && size < 8) return same(0, std::uint32_t{}) && same(size - 4, std::uint32_t{});
+  return std::memcmp(x, y, size) == 0;
+}
+
+}  // namespace Detail
+
+// Look-ups by key are inline: with an index, a probe or two and one comparison of the name;
+// without one (small containers, or an index from before a rename), a walk in the library.
+inline Property::const_iterator Property::FindChild(const PropertyKey& key) const noexcept {
+  const ChildIndex& index = storage_.index;
+  if (type_ == PropertyTypeContainer && index.block != nullptr &&
+      index.epoch == rename_epoch_.load(std::memory_order_relaxed)) {
+    const iterator* const slots = Detail::IndexSlots(index.block);
+    const unsigned char* const control = Detail::IndexControl(index.block, index.mask);
+    const unsigned char tag = Detail::IndexTag(key.hash_);
+    for (std::uint32_t i = key.hash_ & index.mask;; i = (i + 1) & index.mask) {
+      if (control[i] == 0) return children_.end();
+      if (control[i] == tag && slots[i]->name_hash_ == key.hash_ &&
+          Detail::SameName(slots[i]->name_, key.name_)) {
+        return slots[i];
+      }
+    }
+  }
+  return ScanChildren(key.name_, key.hash_);
+}
+
+inline bool Property::ChildExists(const PropertyKey& key) const noexcept {
+  return FindChild(key) != children_.end();
+}
+
+inline const Property& Property::operator[](const PropertyKey& key) const {
+  const const_iterator found = FindChild(key);
+  if (found == children_.end()) {
+    ThrowChildNotFound(key.name_, Detail::kPropertyHeader, __LINE__, BOOST_CURRENT_FUNCTION);
+  }
+  return *found;
+}
 
 /// Prints `property` to `out` for a person to read: one line a node, "name (type)" for
 /// containers and "name (type): value" for leaves, indented by two spaces a level starting at

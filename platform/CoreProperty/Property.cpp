@@ -28,9 +28,6 @@ const char* PropertyTypeName(PropertyTypes type) noexcept {
 namespace Core {
 namespace {
 
-// Advanced whenever a child that an index counts is renamed in place (see below).
-std::atomic<std::uint64_t> g_rename_epoch{0};
-
 std::uint64_t Load64(const char* p) noexcept {
   std::uint64_t word;
   std::memcpy(&word, p, sizeof word);
@@ -112,36 +109,20 @@ struct Property::Internals {
   static_assert(alignof(iterator) <= __STDCPP_DEFAULT_NEW_ALIGNMENT__,
                 "index blocks come from operator new");
 
-  static std::uint64_t Epoch() noexcept { return g_rename_epoch.load(std::memory_order_relaxed); }
-  static void NoteRename() noexcept { g_rename_epoch.fetch_add(1, std::memory_order_relaxed); }
-
-  // Text equality without a library call for the usual short names.
-  static bool SameText(const std::string& a, const std::string& b) noexcept {
-    const std::size_t size = a.size();
-    if (size != b.size()) return false;
-    const char* x = a.data();
-    const char* y = b.data();
-    if (size >= 8 && size <= 16) {
-      return Load64(x) == Load64(y) && Load64(x + size - 8) == Load64(y + size - 8);
-    }
-    if (size >= 4 && size < 8) {
-      return Load32(x) == Load32(y) && Load32(x + size - 4) == Load32(y + size - 4);
-    }
-    return std::memcmp(x, y, size) == 0;
-  }
+  static std::uint64_t Epoch() noexcept { return rename_epoch_.load(std::memory_order_relaxed); }
+  static void NoteRename() noexcept { rename_epoch_.fetch_add(1, std::memory_order_relaxed); }
 
   static bool HasName(const Property& node, const std::string& key, std::uint32_t hash) noexcept {
-    return node.name_hash_ == hash && SameText(node.name_, key);
+    return node.name_hash_ == hash && Detail::SameName(node.name_, key);
   }
 
-  static unsigned char Tag(std::uint32_t hash) noexcept {
-    return static_cast<unsigned char>(0x80u | (hash >> 25));
-  }
+  // The index's slots and control bytes, laid out as the inline look-ups in the header read them.
+  static unsigned char Tag(std::uint32_t hash) noexcept { return Detail::IndexTag(hash); }
   static iterator* Slots(const ChildIndex& index) noexcept {
-    return static_cast<iterator*>(index.block);
+    return const_cast<iterator*>(Detail::IndexSlots(index.block));
   }
   static unsigned char* Control(const ChildIndex& index) noexcept {
-    return reinterpret_cast<unsigned char*>(Slots(index) + index.mask + 1);
+    return const_cast<unsigned char*>(Detail::IndexControl(index.block, index.mask));
   }
   static bool Usable(const Property& node) noexcept {
     return node.type_ == PropertyTypeContainer && node.storage_.index.block != nullptr &&
@@ -416,23 +397,21 @@ Property::const_iterator Property::FindChild(const std::string& key) const noexc
 
 const Property& Property::operator[](const std::string& key) const {
   const const_iterator found = Internals::Find(*this, key);
-  if (found == children_.end()) ThrowChildNotFound(key, __LINE__, BOOST_CURRENT_FUNCTION);
+  if (found == children_.end()) {
+    ThrowChildNotFound(key, __FILE__, __LINE__, BOOST_CURRENT_FUNCTION);
+  }
   return *found;
 }
 
-bool Property::ChildExists(const PropertyKey& key) const noexcept {
-  return Internals::Find(*this, key.name_, key.hash_) != children_.end();
+Property::const_iterator Property::ScanChildren(const std::string& name,
+                                                std::uint32_t hash) const noexcept {
+  for (auto it = children_.begin(); it != children_.end(); ++it) {
+    if (Internals::HasName(*it, name, hash)) return it;
+  }
+  return children_.end();
 }
 
-Property::const_iterator Property::FindChild(const PropertyKey& key) const noexcept {
-  return Internals::Find(*this, key.name_, key.hash_);
-}
-
-const Property& Property::operator[](const PropertyKey& key) const {
-  const const_iterator found = Internals::Find(*this, key.name_, key.hash_);
-  if (found == children_.end()) ThrowChildNotFound(key.name_, __LINE__, BOOST_CURRENT_FUNCTION);
-  return *found;
-}
+std::atomic<std::uint64_t> Property::rename_epoch_{0};
 
 PropertyKey::PropertyKey(const std::string& name) : name_(name), hash_(Hash(name)) {}
 
@@ -524,9 +503,10 @@ void Property::ThrowWrongType(PropertyTypes requested, const char* method, const
                                   ", not " + PropertyTypeName(requested))));
 }
 
-void Property::ThrowChildNotFound(const std::string& key, int line, const char* function) const {
+void Property::ThrowChildNotFound(const std::string& key, const char* file, int line,
+                                  const char* function) const {
   ThrowWithLocation(
-      line, __FILE__, function,
+      line, file, function,
       AddStack(ChildNotFound() << PropertyException::PropertyNameInfo(name_)
                                << PropertyException::PropertyTypeInfo(GetType())
                                << PropertyException::MethodNameInfo("operator[]")
