@@ -97,7 +97,7 @@ class TARVEK_CORE_API Property {
   /// The node's name.
   const std::string& GetName() const noexcept { return name_; }
   /// The node's type.
-  PropertyTypes GetType() const noexcept;
+  PropertyTypes GetType() const noexcept { return static_cast<PropertyTypes>(type_); }
   /// The children, in the order they were added.
   const Children& GetChildren() const noexcept { return children_; }
 

@@ -381,8 +381,6 @@ Property& Property::operator=(const std::string& value) {
 
 Property& Property::operator=(const char* value) { return *this = std::string(value); }
 
-PropertyTypes Property::GetType() const noexcept { return static_cast<PropertyTypes>(type_); }
-
 bool Property::ChildExists(const std::string& key) const noexcept {
   return Internals::Find(*this, key) != children_.end();
 }
