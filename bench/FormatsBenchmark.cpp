@@ -5,6 +5,7 @@
 // each of the others, so that no script is needed to read the results.
 #include <Tarvek/Formats.h>
 #include <benchmark/benchmark.h>
+#include <boost/property_tree/ptree.hpp>
 
 #include <atomic>
 #include <cstddef>
@@ -15,6 +16,8 @@
 #include <new>
 #include <streambuf>
 #include <string>
+#include <tuple>
+#include <utility>
 #include <vector>
 
 #include <unistd.h>
@@ -270,6 +273,54 @@ void TarvekHeapOfOneDescription(benchmark::State& state) {
 }
 
 // ---------------------------------------------------------------------------------------------
+// What the fixed parts of the design cost on their own, to set build and clone against: a
+// std::list holds each child in a heap block of its own, and the runtime entries are a Boost
+// ptree holding the object name.
+
+// As many blocks of a list node's size as a full description has children, allocated and freed.
+void ConstraintListNodes(benchmark::State& state) {
+  const std::size_t children = BuildFull()->GetProperty().GetChildren().size();
+  const std::size_t nodeSize = sizeof(Tarvek::Core::Property) + 2 * sizeof(void*);
+  std::vector<void*> blocks(children);
+  AllocationsPerIteration allocations;
+  for (auto _ : state) {
+    for (void*& block : blocks) block = ::operator new(nodeSize);
+    benchmark::DoNotOptimize(blocks.data());
+    for (void* block : blocks) ::operator delete(block);
+  }
+  allocations.Report(state);
+}
+
+// The runtime entries of a new video description, built as a description builds them.
+boost::property_tree::ptree RuntimeEntries() {
+  boost::property_tree::ptree entries;
+  const boost::property_tree::ptree::value_type entry(
+      std::piecewise_construct, std::forward_as_tuple(Tarvek::Conf::TAG_OBJECT),
+      std::forward_as_tuple(IFormatCodecVideo::TAG_FORMAT_CODEC_VIDEO));
+  entries.push_back(entry);
+  return entries;
+}
+
+void ConstraintRuntimeEntries(benchmark::State& state) {
+  AllocationsPerIteration allocations;
+  for (auto _ : state) {
+    boost::property_tree::ptree entries = RuntimeEntries();
+    benchmark::DoNotOptimize(&entries);
+  }
+  allocations.Report(state);
+}
+
+void ConstraintRuntimeEntriesCopy(benchmark::State& state) {
+  const boost::property_tree::ptree entries = RuntimeEntries();
+  AllocationsPerIteration allocations;
+  for (auto _ : state) {
+    boost::property_tree::ptree copy(entries);
+    benchmark::DoNotOptimize(&copy);
+  }
+  allocations.Report(state);
+}
+
+// ---------------------------------------------------------------------------------------------
 // The floor: a plain struct with the same twelve fields.
 
 struct PlainVideo {
@@ -410,6 +461,9 @@ const bool kRegistered = [] {
   benchmark::RegisterBenchmark("Tarvek/print_content", TarvekPrintContent);
   benchmark::RegisterBenchmark("Tarvek/heap_of_one_description", TarvekHeapOfOneDescription)
       ->Iterations(1000);
+  benchmark::RegisterBenchmark("Constraint/list_nodes", ConstraintListNodes);
+  benchmark::RegisterBenchmark("Constraint/runtime_entries", ConstraintRuntimeEntries);
+  benchmark::RegisterBenchmark("Constraint/runtime_entries_copy", ConstraintRuntimeEntriesCopy);
   benchmark::RegisterBenchmark(Name("PlainStruct", S::kBuild).c_str(), PlainBuild);
   benchmark::RegisterBenchmark(Name("PlainStruct", S::kRead).c_str(), PlainRead);
   benchmark::RegisterBenchmark(Name("PlainStruct", S::kClone).c_str(), PlainClone);
