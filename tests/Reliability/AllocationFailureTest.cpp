@@ -378,4 +378,29 @@ TEST(AllocationFailureTest, ErrorPathsChangeNothing) {
             0u);
 }
 
+// Reading an integer or a flag, testing for a setting, comparing and testing compatibility sit on
+// the hot paths of media applications; none of them may allocate. With every allocation set to
+// fail, they must all still run (after one warm-up call, which may build lasting statics).
+TEST(AllocationFailureTest, IntegerAndFlagReadsCompareAndCompatibilityAllocateNothing) {
+  const CodecPtr video = Video();
+  const CodecPtr twin = Video();
+  const auto& v = dynamic_cast<const Conf::IFormatCodecVideo&>(*video);
+  const auto reads = [&] {
+    long long sum = v.GetBitrate() + v.GetWidth() + v.GetHeight() + v.GetPixelAspectX() +
+                    v.GetPixelAspectY() + v.GetFrameRateNum() + v.GetFrameRateDen() +
+                    static_cast<long long>(v.GetLossless());
+    sum += static_cast<long long>(v.ExistsQuality()) + static_cast<long long>(v.ExistsCodecID()) +
+           static_cast<long long>(v.ExistsPixelFormat());
+    sum += static_cast<long long>(video->Compare(twin)) +
+           static_cast<long long>(video->IsCompatible(twin));
+    return sum;
+  };
+  const long long expected = reads();
+  FailAllocation(1);
+  long long got = 0;
+  EXPECT_NO_THROW(got = reads());
+  EXPECT_FALSE(StopFailing()) << "an allocation was made";
+  EXPECT_EQ(got, expected);
+}
+
 }  // namespace

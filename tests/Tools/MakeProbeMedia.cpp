@@ -242,7 +242,7 @@ void Keep(Track& track, const AVPacket& packet) {
 }
 
 CodecContext OpenEncoder(AVCodecID id, AVFormatContext& output,
-                         void (*configure)(AVCodecContext&, const void*), const void* spec) {
+                         void (*configure)(AVCodecContext&, const void*), const void* stream) {
   const AVCodec* codec = Require(avcodec_find_encoder(id), "finding the encoder");
   CodecContext encoder(Require(avcodec_alloc_context3(codec), "allocating an encoder"));
   encoder->thread_count = 1;
@@ -250,13 +250,13 @@ CodecContext OpenEncoder(AVCodecID id, AVFormatContext& output,
   if ((output.oformat->flags & AVFMT_GLOBALHEADER) != 0) {
     encoder->flags |= AV_CODEC_FLAG_GLOBAL_HEADER;
   }
-  configure(*encoder, spec);
+  configure(*encoder, stream);
   Check(avcodec_open2(encoder.get(), codec, nullptr), "opening the encoder");
   return encoder;
 }
 
-void ConfigureVideo(AVCodecContext& encoder, const void* spec) {
-  const auto& video = *static_cast<const VideoStream*>(spec);
+void ConfigureVideo(AVCodecContext& encoder, const void* stream) {
+  const auto& video = *static_cast<const VideoStream*>(stream);
   encoder.width = video.width;
   encoder.height = video.height;
   encoder.sample_aspect_ratio = video.pixelAspect;
@@ -299,8 +299,8 @@ void AddVideo(AVFormatContext& output, const VideoStream& video, std::vector<Tra
   tracks.push_back(std::move(track));
 }
 
-void ConfigureAudio(AVCodecContext& encoder, const void* spec) {
-  const auto& audio = *static_cast<const AudioStream*>(spec);
+void ConfigureAudio(AVCodecContext& encoder, const void* stream) {
+  const auto& audio = *static_cast<const AudioStream*>(stream);
   encoder.sample_rate = audio.sampleRate;
   encoder.time_base = AVRational{1, audio.sampleRate};
   Check(av_channel_layout_from_mask(&encoder.ch_layout, audio.layout), "setting the layout");
