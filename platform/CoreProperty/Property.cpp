@@ -188,7 +188,8 @@ struct Property::Internals {
     if (count < kIndexThreshold || count > (std::size_t{1} << 28)) return;
     std::uint64_t slots = kFirstSlots;
     while ((count + 1) * 4 > slots * 3) slots *= 2;
-    void* const block = ::operator new(slots*(sizeof(iterator) + 1), std::nothrow);
+    const std::uint64_t bytes = slots * (sizeof(iterator) + 1);  // the slots, then their control
+    void* const block = ::operator new(bytes, std::nothrow);
     if (block == nullptr) return;
     ChildIndex index{block, static_cast<std::uint32_t>(slots - 1), 0, Epoch()};
     std::memset(Control(index), 0, slots);
