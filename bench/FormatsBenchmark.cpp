@@ -16,7 +16,6 @@
 #include <new>
 #include <streambuf>
 #include <string>
-#include <tuple>
 #include <utility>
 #include <vector>
 
@@ -293,11 +292,10 @@ void ConstraintListNodes(benchmark::State& state) {
 
 // The runtime entries of a new video description, built as a description builds them.
 boost::property_tree::ptree RuntimeEntries() {
+  static const boost::property_tree::ptree::value_type kEmptyEntry(Tarvek::Conf::TAG_OBJECT,
+                                                                   boost::property_tree::ptree());
   boost::property_tree::ptree entries;
-  const boost::property_tree::ptree::value_type entry(
-      std::piecewise_construct, std::forward_as_tuple(Tarvek::Conf::TAG_OBJECT),
-      std::forward_as_tuple(IFormatCodecVideo::TAG_FORMAT_CODEC_VIDEO));
-  entries.push_back(entry);
+  entries.push_back(kEmptyEntry)->second.data() = IFormatCodecVideo::TAG_FORMAT_CODEC_VIDEO;
   return entries;
 }
 

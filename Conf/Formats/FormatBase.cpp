@@ -1,18 +1,18 @@
 #include "FormatBase.h"
 
 #include <iostream>
-#include <tuple>
 #include <utility>
 
 namespace Tarvek {
 namespace Conf {
 
 FormatBase::FormatBase(const std::string& name) : property_(name) {
-  // The key holds no '.', so put() would read it as a path of one top-level entry; push_back adds
-  // that entry without parsing a path, and the entry built in place spares a temporary tree.
-  const boost::property_tree::ptree::value_type entry(
-      std::piecewise_construct, std::forward_as_tuple(TAG_OBJECT), std::forward_as_tuple(name));
-  internal_properties_.push_back(entry);
+  // The key holds no '.', so put() would read it as a path of one top-level entry. This adds that
+  // entry without parsing a path or building a temporary tree: a copy of an empty entry kept for
+  // the purpose, then its value.
+  static const boost::property_tree::ptree::value_type kEmptyEntry(TAG_OBJECT,
+                                                                   boost::property_tree::ptree());
+  internal_properties_.push_back(kEmptyEntry)->second.data() = name;
   property_.SetChild(TAG_METADATA);
 }
 
