@@ -51,7 +51,7 @@ std::uint64_t FoldMiddle(const char* data, std::size_t size, std::uint64_t a) no
 }
 
 // A hash for short texts (names are mostly under 16 bytes): two words that cover the text,
-// overlapping when it is shorter than 16 bytes, multiplied and folded. Longer names fold their
+// overlapping when it is shorter than 16 bytes, multiplied and mixed. Longer names fold their
 // leading words in first. Kept nowhere lasting, so it need not agree between machines.
 std::uint32_t Hash(const std::string& name) noexcept {
   constexpr std::uint64_t k0 = 0x9E3779B97F4A7C15ull;
@@ -75,8 +75,13 @@ std::uint32_t Hash(const std::string& name) noexcept {
     a = size == 0 ? 0 : byte(0);
     b = size == 0 ? 0 : byte(size - 1) << 8 | byte(size / 2);
   }
-  const std::uint64_t h = ((a ^ size) * k0) ^ (b * k1);
-  return static_cast<std::uint32_t>(h ^ (h >> 32));
+  std::uint64_t h = ((a ^ size) * k0) ^ (b * k1);
+  // Mixed down as well as up: names that differ only in their last bytes (x_num, x_den) must
+  // differ in the low bits too, which choose the index slot.
+  h ^= h >> 32;
+  h *= k0;
+  h ^= h >> 29;
+  return static_cast<std::uint32_t>(h);
 }
 
 }  // namespace
