@@ -5,6 +5,13 @@
 
 namespace Tarvek {
 namespace Conf {
+namespace {
+
+// The keys this description reads, hashed once when the library is loaded. The key texts
+// come from the configuration interface library, which is loaded and initialised first.
+const Core::PropertyKey kMetadataKey(IFormat::TAG_METADATA);
+
+}  // namespace
 
 FormatBase::FormatBase(const std::string& name) : property_(name) {
   // The key holds no '.', so put() would read it as a path of one top-level entry. This adds that
@@ -52,7 +59,7 @@ void FormatBase::SetMetadata(const Core::Property& metadata) {
   property_.SetChild(TAG_METADATA, metadata);
 }
 
-const Core::Property& FormatBase::GetMetadata() const { return property_[KeyOf<TAG_METADATA>()]; }
+const Core::Property& FormatBase::GetMetadata() const { return property_[kMetadataKey]; }
 
 void FormatBase::PrintContent() {
   std::ostream& out = std::cout;

@@ -58,14 +58,6 @@ class TARVEK_FORMATS_API FormatBase : public virtual IFormat {
   /// fresh count. The trees are copied once, straight from the source.
   explicit FormatBase(TreesOf trees);
 
-  /// The key of the tree child named `Tag` (a key constant of the interfaces), hashed once on first
-  /// use: the accessors read with it, so that a read computes no hash.
-  template <const std::string& Tag>
-  static const Core::PropertyKey& KeyOf() {
-    static const Core::PropertyKey key(Tag);
-    return key;
-  }
-
   /// `other` as the interface `Kind`, or null when it is not one (or is null): a dynamic_cast,
   /// with a shortcut for the usual case of a description of exactly the class `Exact`, which two
   /// type comparisons establish.

@@ -10,6 +10,16 @@ namespace Tarvek {
 namespace Conf {
 namespace {
 
+// The keys this description reads, hashed once when the library is loaded. The key texts
+// come from the configuration interface library, which is loaded and initialised first.
+const Core::PropertyKey kWidthKey(IFormatCodecVideo::TAG_WIDTH);
+const Core::PropertyKey kHeightKey(IFormatCodecVideo::TAG_HEIGHT);
+const Core::PropertyKey kAspectxKey(IFormatCodecVideo::TAG_ASPECTX);
+const Core::PropertyKey kAspectyKey(IFormatCodecVideo::TAG_ASPECTY);
+const Core::PropertyKey kTimebaseNKey(IFormatCodecVideo::TAG_TIMEBASE_N);
+const Core::PropertyKey kTimebaseDKey(IFormatCodecVideo::TAG_TIMEBASE_D);
+const Core::PropertyKey kPixFmtKey(IFormatCodecVideo::TAG_PIX_FMT);
+
 unsigned int LowBits(long long value) { return static_cast<unsigned int>(value); }
 
 // Reduces (a x b) : (c x d) to lowest terms. The products are exact in 64 bits, so a large
@@ -67,38 +77,32 @@ bool FormatCodecVideo::IsCompatible(boost::intrusive_ptr<const IFormat> other) c
          GetPixelAspectY() == video->GetPixelAspectY();
 }
 
-unsigned int FormatCodecVideo::GetWidth() const {
-  return LowBits(property_[KeyOf<TAG_WIDTH>()].GetInt64());
-}
-bool FormatCodecVideo::ExistsWidth() const { return property_.ChildExists(KeyOf<TAG_WIDTH>()); }
+unsigned int FormatCodecVideo::GetWidth() const { return LowBits(property_[kWidthKey].GetInt64()); }
+bool FormatCodecVideo::ExistsWidth() const { return property_.ChildExists(kWidthKey); }
 void FormatCodecVideo::SetWidth(unsigned int width) {
   property_.SetChildT<long long>(TAG_WIDTH, width);
 }
 
 unsigned int FormatCodecVideo::GetHeight() const {
-  return LowBits(property_[KeyOf<TAG_HEIGHT>()].GetInt64());
+  return LowBits(property_[kHeightKey].GetInt64());
 }
-bool FormatCodecVideo::ExistsHeight() const { return property_.ChildExists(KeyOf<TAG_HEIGHT>()); }
+bool FormatCodecVideo::ExistsHeight() const { return property_.ChildExists(kHeightKey); }
 void FormatCodecVideo::SetHeight(unsigned int height) {
   property_.SetChildT<long long>(TAG_HEIGHT, height);
 }
 
 unsigned int FormatCodecVideo::GetPixelAspectX() const {
-  return LowBits(property_[KeyOf<TAG_ASPECTX>()].GetInt64());
+  return LowBits(property_[kAspectxKey].GetInt64());
 }
-bool FormatCodecVideo::ExistsPixelAspectX() const {
-  return property_.ChildExists(KeyOf<TAG_ASPECTX>());
-}
+bool FormatCodecVideo::ExistsPixelAspectX() const { return property_.ChildExists(kAspectxKey); }
 void FormatCodecVideo::SetPixelAspectX(unsigned int aspectX) {
   property_.SetChildT<long long>(TAG_ASPECTX, aspectX);
 }
 
 unsigned int FormatCodecVideo::GetPixelAspectY() const {
-  return LowBits(property_[KeyOf<TAG_ASPECTY>()].GetInt64());
+  return LowBits(property_[kAspectyKey].GetInt64());
 }
-bool FormatCodecVideo::ExistsPixelAspectY() const {
-  return property_.ChildExists(KeyOf<TAG_ASPECTY>());
-}
+bool FormatCodecVideo::ExistsPixelAspectY() const { return property_.ChildExists(kAspectyKey); }
 void FormatCodecVideo::SetPixelAspectY(unsigned int aspectY) {
   property_.SetChildT<long long>(TAG_ASPECTY, aspectY);
 }
@@ -130,21 +134,17 @@ double FormatCodecVideo::GetFrameAspect() const {
 }
 
 unsigned int FormatCodecVideo::GetFrameRateNum() const {
-  return LowBits(property_[KeyOf<TAG_TIMEBASE_N>()].GetInt64());
+  return LowBits(property_[kTimebaseNKey].GetInt64());
 }
-bool FormatCodecVideo::ExistsFrameRateNum() const {
-  return property_.ChildExists(KeyOf<TAG_TIMEBASE_N>());
-}
+bool FormatCodecVideo::ExistsFrameRateNum() const { return property_.ChildExists(kTimebaseNKey); }
 void FormatCodecVideo::SetFrameRateNum(unsigned int numerator) {
   property_.SetChildT<long long>(TAG_TIMEBASE_N, numerator);
 }
 
 unsigned int FormatCodecVideo::GetFrameRateDen() const {
-  return LowBits(property_[KeyOf<TAG_TIMEBASE_D>()].GetInt64());
+  return LowBits(property_[kTimebaseDKey].GetInt64());
 }
-bool FormatCodecVideo::ExistsFrameRateDen() const {
-  return property_.ChildExists(KeyOf<TAG_TIMEBASE_D>());
-}
+bool FormatCodecVideo::ExistsFrameRateDen() const { return property_.ChildExists(kTimebaseDKey); }
 void FormatCodecVideo::SetFrameRateDen(unsigned int denominator) {
   property_.SetChildT<long long>(TAG_TIMEBASE_D, denominator);
 }
@@ -156,11 +156,9 @@ double FormatCodecVideo::GetFrameRate() const {
 }
 
 AVPixelFormat FormatCodecVideo::GetPixelFormat() const {
-  return static_cast<AVPixelFormat>(static_cast<int>(property_[KeyOf<TAG_PIX_FMT>()].GetInt64()));
+  return static_cast<AVPixelFormat>(static_cast<int>(property_[kPixFmtKey].GetInt64()));
 }
-bool FormatCodecVideo::ExistsPixelFormat() const {
-  return property_.ChildExists(KeyOf<TAG_PIX_FMT>());
-}
+bool FormatCodecVideo::ExistsPixelFormat() const { return property_.ChildExists(kPixFmtKey); }
 void FormatCodecVideo::SetPixelFormat(AVPixelFormat format) {
   property_.SetChildT<long long>(TAG_PIX_FMT, static_cast<long long>(format));
 }
