@@ -2,6 +2,8 @@
 // operator[] (by text and by PropertyKey) must always be those of a plain scan for the first child
 // of the name, however the children were added, copied, moved, emptied or renamed in place. Large
 // containers keep an index of their children, so these cases cross its size thresholds.
+#include <iterator>
+#include <random>
 #include <string>
 #include <utility>
 #include <vector>
@@ -189,6 +191,72 @@ TEST(PropertyLookupTest, KeysReadLikeTheirTexts) {
   EXPECT_EQ(ItemOf<ChildNotFound::ChildNameInfo>(*error), "sample_aspect_dem");
   EXPECT_EQ(ItemOf<Tarvek::Core::PropertyException::PropertyNameInfo>(*error), "node");
   EXPECT_FALSE(Property("leaf", 1LL).ChildExists(key));
+}
+
+std::size_t Nodes(const Property& node) {
+  std::size_t count = 1;
+  for (const Property& child : node.GetChildren()) count += Nodes(child);
+  return count;
+}
+
+// A long run of random edits (appends of every kind, renames by moving into and out of children,
+// copies, emptying, value assignments) on a few containers that grow past the index thresholds;
+// after every edit each look-up must still agree with the scan. The seed is fixed, so a failure
+// repeats.
+TEST(PropertyLookupTest, RandomEditsKeepLookUpsRight) {
+  std::mt19937 random(20261206);
+  const auto pick = [&random](std::size_t count) {
+    return std::uniform_int_distribution<std::size_t>(0, count - 1)(random);
+  };
+  const auto name = [&] { return kNames[pick(kNames.size())]; };
+  std::vector<Property> trees(3, Property("tree"));
+  for (int step = 0; step < 3000; ++step) {
+    Property& tree = trees[pick(trees.size())];
+    Property& other = trees[pick(trees.size())];
+    // Copies of trees into trees grow fast: a tree past a few hundred nodes starts again.
+    if (Nodes(tree) > 300) tree = Property("tree");
+    const auto child = [&](Property& node) -> Property* {
+      if (node.GetChildren().empty()) return nullptr;
+      auto it = node.FindChild(node.GetChildren().begin()->GetName());
+      std::advance(it, static_cast<long>(pick(node.GetChildren().size())));
+      return &*it;
+    };
+    switch (pick(9)) {
+      case 0:
+        tree.SetChildT<long long>(name(), step);
+        break;
+      case 1:
+        tree.CreateChildT<std::string>(name(), "v");
+        break;
+      case 2:
+        tree[name()];
+        break;
+      case 3:  // renamed in place: a child takes another property's name
+        if (Property* target = child(tree)) *target = Property(name(), 1LL);
+        break;
+      case 4:  // renamed in place: a child moved out of is left unnamed
+        if (Property* source = child(tree)) Property taken(std::move(*source));
+        break;
+      case 5:
+        if (&tree != &other) tree = other;
+        break;
+      case 6:  // a child container filled or emptied in place
+        if (Property* target = child(tree)) {
+          if (target->GetType() == Tarvek::PropertyTypeContainer) target->SetChild(name());
+        }
+        break;
+      case 7:
+        if (pick(20) == 0) tree = true;  // now and then a tree becomes a leaf and starts again
+        if (tree.GetType() != Tarvek::PropertyTypeContainer) tree = Property("tree");
+        break;
+      default:
+        tree.SetChild(name(), other);
+        break;
+    }
+    SCOPED_TRACE("step " + std::to_string(step));
+    ExpectLookUpsAgreeWithScan(tree);
+    if (::testing::Test::HasFailure()) return;
+  }
 }
 
 }  // namespace
