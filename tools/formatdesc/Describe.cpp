@@ -231,4 +231,9 @@ std::vector<LadderRow> BuildLadder(const std::string& codecId, Pair frameRate,
   return rows;
 }
 
+std::string LibraryDescription(const Tarvek::Exception& e) {
+  const std::string* description = boost::get_error_info<Tarvek::DescriptionInfo>(e);
+  return description != nullptr ? *description : std::string("the library gave no description");
+}
+
 }  // namespace Formatdesc

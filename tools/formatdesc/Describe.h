@@ -107,6 +107,10 @@ Bitrates AudioBitrates(const boost::intrusive_ptr<const Tarvek::Conf::IFormatCod
 /// The option that gives the setting stored under `key`, or "" for a key no option gives alone.
 std::string OptionForSetting(const std::string& key);
 
+/// The library's own description of error `e` (its DescriptionInfo), or a fixed sentence saying
+/// it gave none.
+std::string LibraryDescription(const Tarvek::Exception& e);
+
 /// One row of a bitrate ladder: a usual picture size and its bitrates.
 struct LadderRow {
   std::string name;  // "1080p"

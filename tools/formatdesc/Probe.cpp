@@ -35,12 +35,6 @@ using Tarvek::Conf::IFormatCodecVideo;
 // description itself keeps only what the file says.
 const char kTargetBitrateMode[] = "cbr";
 
-// The library's description of its error, or a fixed sentence when it gave none.
-std::string LibraryText(const Tarvek::Exception& e) {
-  const std::string* description = boost::get_error_info<Tarvek::DescriptionInfo>(e);
-  return description != nullptr ? *description : std::string("the library gave no description");
-}
-
 // A setting the bitrates read, as a sentence names it.
 std::string SettingPhrase(const std::string& key) {
   static const std::map<std::string, std::string> phrases = {
@@ -269,7 +263,7 @@ void Judge(StreamReport& report, const AVCodecParameters& parameters) {
                        ", which the file does not give)";
     return;
   } catch (const Tarvek::Exception& e) {
-    report.noVerdict = "none (the presets refuse the description: " + LibraryText(e) + ")";
+    report.noVerdict = "none (the presets refuse the description: " + LibraryDescription(e) + ")";
     return;
   }
   if (!report.description->ExistsBitrate()) {
@@ -446,7 +440,7 @@ StreamReport DescribeStream(const AVStream& stream) {
     report.range.reset();
     report.verdict.reset();
     report.noVerdict.clear();
-    report.damage = "the library refused its description: " + LibraryText(e);
+    report.damage = "the library refused its description: " + LibraryDescription(e);
   }
   return report;
 }

@@ -394,8 +394,7 @@ void RunCodecs(const CodecsArgs& args) {
 // The library's own description of its error, and for a setting the bitrates need, the option
 // that gives it.
 std::string LibraryMessage(const Tarvek::Exception& e) {
-  const std::string* description = boost::get_error_info<Tarvek::DescriptionInfo>(e);
-  std::string message = description != nullptr ? *description : "the library gave no description";
+  std::string message = LibraryDescription(e);
   const std::string* child = boost::get_error_info<Tarvek::Core::ChildNotFound::ChildNameInfo>(e);
   if (child != nullptr && !OptionForSetting(*child).empty()) {
     message += " (needed for the bitrates: give " + OptionForSetting(*child) +
