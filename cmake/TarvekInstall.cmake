@@ -1,29 +1,30 @@
-# Installs the libraries, the public headers under <prefix>/include/Tarvek, a CMake package
-# (find_package(TarvekFormats) -> Tarvek::Formats) and the pkg-config file tarvek-formats.pc.
+# The CMake package TarvekFormats: the export sets that tarvek_install_library filled, the package
+# configuration and its version. Each optional component <C> installs its export set
+# Tarvek<C>Targets and cmake/Tarvek<C>Config.cmake, which finds the component's own dependencies,
+# includes its targets and sets TarvekFormats_<C>_FOUND.
 include(CMakePackageConfigHelpers)
 
 set(TARVEK_CMAKE_DIR "${CMAKE_INSTALL_LIBDIR}/cmake/TarvekFormats")
 
-install(TARGETS TarvekAVUtilHeaders TarvekCore TarvekConfInterfaces TarvekMediaWrapper
-                TarvekPresets TarvekFormats TarvekInspect
-        EXPORT TarvekFormatsTargets
-        LIBRARY DESTINATION "${CMAKE_INSTALL_LIBDIR}"
-        ARCHIVE DESTINATION "${CMAKE_INSTALL_LIBDIR}"
-        RUNTIME DESTINATION "${CMAKE_INSTALL_BINDIR}")
-
-install(FILES "${PROJECT_SOURCE_DIR}/Formats.h"
+install(TARGETS TarvekAVUtilHeaders EXPORT TarvekFormatsTargets)
+install(FILES "${PROJECT_SOURCE_DIR}/Conf/Formats/Formats.h"
         DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}/Tarvek")
-install(FILES "${PROJECT_SOURCE_DIR}/platform/MediaWrapper/Reduce.h"
-        DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}/Tarvek/MediaWrapper")
-install(FILES "${PROJECT_SOURCE_DIR}/platform/Presets/BitratePresets.h"
-        DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}/Tarvek/Presets")
-foreach(dir Core/Interfaces Core/Errors Conf/Interfaces Conf/Formats)
-  install(DIRECTORY "${PROJECT_SOURCE_DIR}/${dir}/"
-          DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}/Tarvek/${dir}"
-          FILES_MATCHING PATTERN "*.h")
-endforeach()
 
-install(EXPORT TarvekFormatsTargets NAMESPACE Tarvek:: DESTINATION "${TARVEK_CMAKE_DIR}")
+get_property(components GLOBAL PROPERTY TARVEK_COMPONENTS)
+list(REMOVE_DUPLICATES components)
+set(TARVEK_OPTIONAL_COMPONENTS "")
+foreach(component IN LISTS components)
+  install(EXPORT Tarvek${component}Targets NAMESPACE Tarvek:: DESTINATION "${TARVEK_CMAKE_DIR}")
+  if(NOT component STREQUAL "Formats")
+    list(APPEND TARVEK_OPTIONAL_COMPONENTS ${component})
+    install(FILES "${PROJECT_SOURCE_DIR}/cmake/Tarvek${component}Config.cmake"
+            DESTINATION "${TARVEK_CMAKE_DIR}")
+  endif()
+endforeach()
+string(REPLACE ";" ", " TARVEK_OPTIONAL_COMPONENTS "${TARVEK_OPTIONAL_COMPONENTS}")
+if(NOT TARVEK_OPTIONAL_COMPONENTS)
+  set(TARVEK_OPTIONAL_COMPONENTS "none in this build")
+endif()
 
 configure_package_config_file("${PROJECT_SOURCE_DIR}/cmake/TarvekFormatsConfig.cmake.in"
                               "${PROJECT_BINARY_DIR}/TarvekFormatsConfig.cmake"
@@ -33,10 +34,3 @@ write_basic_package_version_file("${PROJECT_BINARY_DIR}/TarvekFormatsConfigVersi
 install(FILES "${PROJECT_BINARY_DIR}/TarvekFormatsConfig.cmake"
               "${PROJECT_BINARY_DIR}/TarvekFormatsConfigVersion.cmake"
         DESTINATION "${TARVEK_CMAKE_DIR}")
-
-file(RELATIVE_PATH TARVEK_PC_TO_PREFIX "/${CMAKE_INSTALL_LIBDIR}/pkgconfig" "/")
-string(REGEX REPLACE "/$" "" TARVEK_PC_TO_PREFIX "${TARVEK_PC_TO_PREFIX}")
-configure_file("${PROJECT_SOURCE_DIR}/cmake/tarvek-formats.pc.in"
-               "${PROJECT_BINARY_DIR}/tarvek-formats.pc" @ONLY)
-install(FILES "${PROJECT_BINARY_DIR}/tarvek-formats.pc"
-        DESTINATION "${CMAKE_INSTALL_LIBDIR}/pkgconfig")

@@ -28,6 +28,7 @@
 #include <vector>
 
 #include <Tarvek/Formats.h>
+#include <Tarvek/Presets/BitratePresets.h>
 #include <boost/exception/get_error_info.hpp>
 
 #include "../tests/Support/CountingBlob.h"

@@ -3,6 +3,7 @@
 // description. Anything else (another exception, a sanitizer report, a round trip that changes
 // something) is a crash.
 #include <Tarvek/Formats.h>
+#include <Tarvek/Inspect/JsonForm.h>
 
 #include <cstddef>
 #include <cstdint>

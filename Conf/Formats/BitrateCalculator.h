@@ -7,8 +7,8 @@
 #include <boost/intrusive_ptr.hpp>
 
 #include "../../Core/Errors/ConfException.h"
-#include "../../Core/Interfaces/Export.h"
 #include "../Interfaces/IFormatCodec.h"
+#include "Export.h"
 
 namespace Tarvek {
 namespace Conf {

@@ -2,16 +2,10 @@
 
 #include <iostream>
 #include <utility>
+#include "../Interfaces/Keys.h"
 
 namespace Tarvek {
 namespace Conf {
-namespace {
-
-// The keys this description reads, hashed once when the library is loaded. The key texts
-// come from the configuration interface library, which is loaded and initialised first.
-const Core::PropertyKey kMetadataKey(IFormat::TAG_METADATA);
-
-}  // namespace
 
 FormatBase::FormatBase(const std::string& name) : property_(name) {
   // The key holds no '.', so put() would read it as a path of one top-level entry. This adds that
@@ -59,7 +53,7 @@ void FormatBase::SetMetadata(const Core::Property& metadata) {
   property_.SetChild(TAG_METADATA, metadata);
 }
 
-const Core::Property& FormatBase::GetMetadata() const { return property_[kMetadataKey]; }
+const Core::Property& FormatBase::GetMetadata() const { return property_[Keys::Metadata]; }
 
 void FormatBase::PrintContent() {
   std::ostream& out = std::cout;

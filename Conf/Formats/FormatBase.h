@@ -9,16 +9,14 @@
 #include <string>
 #include <typeinfo>
 
-#include "../../Core/Interfaces/Export.h"
 #include "../../Core/Interfaces/Property.h"
 #include "../../Core/Interfaces/RefCountImpl.h"
 #include "../Interfaces/IFormat.h"
+#include "ChildHelpers.h"
+#include "Export.h"
 
 namespace Tarvek {
 namespace Conf {
-
-/// Key of the runtime entry holding a description's object name.
-const std::string TAG_OBJECT = "object_name";
 
 /// The shared part of every description. Constructed with an object name, which names the
 /// property tree's root and is recorded as the runtime entry TAG_OBJECT. The count starts at 0;

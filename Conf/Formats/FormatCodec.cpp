@@ -1,28 +1,10 @@
 #include "FormatCodec.h"
 
 #include <utility>
+#include "../Interfaces/Keys.h"
 
 namespace Tarvek {
 namespace Conf {
-namespace {
-
-// The keys this description reads, hashed once when the library is loaded. The key texts
-// come from the configuration interface library, which is loaded and initialised first.
-const Core::PropertyKey kNameKey(IFormatCodec::TAG_NAME);
-const Core::PropertyKey kCodecIdKey(IFormatCodec::TAG_CODEC_ID);
-const Core::PropertyKey kFourccKey(IFormatCodec::TAG_FOURCC);
-const Core::PropertyKey kBitrateModeKey(IFormatCodec::TAG_BITRATE_MODE);
-const Core::PropertyKey kBitrateKey(IFormatCodec::TAG_BITRATE);
-const Core::PropertyKey kQualityKey(IFormatCodec::TAG_QUALITY);
-const Core::PropertyKey kLosslessKey(IFormatCodec::TAG_LOSSLESS);
-const Core::PropertyKey kThreadNumberKey(IFormatCodec::TAG_THREAD_NUMBER);
-const Core::PropertyKey kTwoPassEncodingKey(IFormatCodec::TAG_TWO_PASS_ENCODING);
-const Core::PropertyKey kGlobalHeaderKey(IFormatCodec::TAG_GLOBAL_HEADER);
-const Core::PropertyKey kMainStreamKey(IFormatCodec::TAG_MAIN_STREAM);
-const Core::PropertyKey kCodecOptionsEncodeKey(IFormatCodec::TAG_CODEC_OPTIONS_ENCODE);
-const Core::PropertyKey kCodecOptionsAnalyzeKey(IFormatCodec::TAG_CODEC_OPTIONS_ANALYZE);
-
-}  // namespace
 
 boost::intrusive_ptr<IFormatCodec> FormatCodec::Create() {
   return boost::intrusive_ptr<IFormatCodec>(new FormatCodec(""));
@@ -40,78 +22,78 @@ FormatCodec::~FormatCodec() = default;
 
 int FormatCodec::GetCodecType() const { return -1; }
 
-std::string FormatCodec::GetCodecName() const { return property_[kNameKey].GetString(); }
-bool FormatCodec::ExistsCodecName() const { return property_.ChildExists(kNameKey); }
+std::string FormatCodec::GetCodecName() const { return property_[Keys::CodecName].GetString(); }
+bool FormatCodec::ExistsCodecName() const { return property_.ChildExists(Keys::CodecName); }
 void FormatCodec::SetCodecName(const std::string& name) {
   property_.SetChildT<std::string>(TAG_NAME, name);
 }
 
-std::string FormatCodec::GetCodecID() const { return property_[kCodecIdKey].GetString(); }
-bool FormatCodec::ExistsCodecID() const { return property_.ChildExists(kCodecIdKey); }
+std::string FormatCodec::GetCodecID() const { return property_[Keys::CodecId].GetString(); }
+bool FormatCodec::ExistsCodecID() const { return property_.ChildExists(Keys::CodecId); }
 void FormatCodec::SetCodecID(const std::string& id) {
   property_.SetChildT<std::string>(TAG_CODEC_ID, id);
 }
 
-long long FormatCodec::GetCodecTag() const { return property_[kFourccKey].GetInt64(); }
-bool FormatCodec::ExistsCodecTag() const { return property_.ChildExists(kFourccKey); }
+long long FormatCodec::GetCodecTag() const { return property_[Keys::Fourcc].GetInt64(); }
+bool FormatCodec::ExistsCodecTag() const { return property_.ChildExists(Keys::Fourcc); }
 void FormatCodec::SetCodecTag(long long tag) { property_.SetChildT<long long>(TAG_FOURCC, tag); }
 
-std::string FormatCodec::GetBitrateMode() const { return property_[kBitrateModeKey].GetString(); }
-bool FormatCodec::ExistsBitrateMode() const { return property_.ChildExists(kBitrateModeKey); }
+std::string FormatCodec::GetBitrateMode() const { return property_[Keys::BitrateMode].GetString(); }
+bool FormatCodec::ExistsBitrateMode() const { return property_.ChildExists(Keys::BitrateMode); }
 void FormatCodec::SetBitrateMode(const std::string& mode) {
   property_.SetChildT<std::string>(TAG_BITRATE_MODE, mode);
 }
 
-long long FormatCodec::GetBitrate() const { return property_[kBitrateKey].GetInt64(); }
-bool FormatCodec::ExistsBitrate() const { return property_.ChildExists(kBitrateKey); }
+long long FormatCodec::GetBitrate() const { return property_[Keys::Bitrate].GetInt64(); }
+bool FormatCodec::ExistsBitrate() const { return property_.ChildExists(Keys::Bitrate); }
 void FormatCodec::SetBitrate(long long bitrate) {
   property_.SetChildT<long long>(TAG_BITRATE, bitrate);
 }
 
-long long FormatCodec::GetQuality() const { return property_[kQualityKey].GetInt64(); }
-bool FormatCodec::ExistsQuality() const { return property_.ChildExists(kQualityKey); }
+long long FormatCodec::GetQuality() const { return property_[Keys::Quality].GetInt64(); }
+bool FormatCodec::ExistsQuality() const { return property_.ChildExists(Keys::Quality); }
 void FormatCodec::SetQuality(long long quality) {
   property_.SetChildT<long long>(TAG_QUALITY, quality);
 }
 
-bool FormatCodec::GetLossless() const { return property_[kLosslessKey].GetBool(); }
-bool FormatCodec::ExistsLossless() const { return property_.ChildExists(kLosslessKey); }
+bool FormatCodec::GetLossless() const { return property_[Keys::Lossless].GetBool(); }
+bool FormatCodec::ExistsLossless() const { return property_.ChildExists(Keys::Lossless); }
 void FormatCodec::SetLossless(bool lossless) { property_.SetChildT<bool>(TAG_LOSSLESS, lossless); }
 
 unsigned int FormatCodec::GetThreadNumber() const {
-  return static_cast<unsigned int>(property_[kThreadNumberKey].GetInt64());
+  return static_cast<unsigned int>(property_[Keys::ThreadNumber].GetInt64());
 }
-bool FormatCodec::ExistsThreadNumber() const { return property_.ChildExists(kThreadNumberKey); }
+bool FormatCodec::ExistsThreadNumber() const { return property_.ChildExists(Keys::ThreadNumber); }
 void FormatCodec::SetThreadNumber(unsigned int threads) {
   // Zero extension: counts from 2^31 up are stored as the positive numbers they are.
   property_.SetChildT<long long>(TAG_THREAD_NUMBER, static_cast<long long>(threads));
 }
 
-bool FormatCodec::GetTwoPassEncoding() const { return property_[kTwoPassEncodingKey].GetBool(); }
+bool FormatCodec::GetTwoPassEncoding() const { return property_[Keys::TwoPassEncoding].GetBool(); }
 bool FormatCodec::ExistsTwoPassEncoding() const {
-  return property_.ChildExists(kTwoPassEncodingKey);
+  return property_.ChildExists(Keys::TwoPassEncoding);
 }
 void FormatCodec::SetTwoPassEncoding(bool twoPass) {
   property_.SetChildT<bool>(TAG_TWO_PASS_ENCODING, twoPass);
 }
 
-bool FormatCodec::GetGlobalHeader() const { return property_[kGlobalHeaderKey].GetBool(); }
-bool FormatCodec::ExistsGlobalHeader() const { return property_.ChildExists(kGlobalHeaderKey); }
+bool FormatCodec::GetGlobalHeader() const { return property_[Keys::GlobalHeader].GetBool(); }
+bool FormatCodec::ExistsGlobalHeader() const { return property_.ChildExists(Keys::GlobalHeader); }
 void FormatCodec::SetGlobalHeader(bool globalHeader) {
   property_.SetChildT<bool>(TAG_GLOBAL_HEADER, globalHeader);
 }
 
-bool FormatCodec::GetMainStream() const { return property_[kMainStreamKey].GetBool(); }
-bool FormatCodec::ExistsMainStream() const { return property_.ChildExists(kMainStreamKey); }
+bool FormatCodec::GetMainStream() const { return property_[Keys::MainStream].GetBool(); }
+bool FormatCodec::ExistsMainStream() const { return property_.ChildExists(Keys::MainStream); }
 void FormatCodec::SetMainStream(bool mainStream) {
   property_.SetChildT<bool>(TAG_MAIN_STREAM, mainStream);
 }
 
 bool FormatCodec::ExistsOptionsEncode() const {
-  return property_.ChildExists(kCodecOptionsEncodeKey);
+  return property_.ChildExists(Keys::CodecOptionsEncode);
 }
 bool FormatCodec::ExistsOptionsAnalyze() const {
-  return property_.ChildExists(kCodecOptionsAnalyzeKey);
+  return property_.ChildExists(Keys::CodecOptionsAnalyze);
 }
 // SetChild assigns to the child, or appends a complete copy when SetProperty removed it, so a
 // copy that fails leaves the tree as it was (no empty child appended first).
@@ -119,13 +101,13 @@ void FormatCodec::SetOptionsEncode(const Core::Property& options) {
   property_.SetChild(TAG_CODEC_OPTIONS_ENCODE, options);
 }
 const Core::Property& FormatCodec::GetOptionsEncode() const {
-  return property_[kCodecOptionsEncodeKey];
+  return property_[Keys::CodecOptionsEncode];
 }
 void FormatCodec::SetOptionsAnalyze(const Core::Property& options) {
   property_.SetChild(TAG_CODEC_OPTIONS_ANALYZE, options);
 }
 const Core::Property& FormatCodec::GetOptionsAnalyze() const {
-  return property_[kCodecOptionsAnalyzeKey];
+  return property_[Keys::CodecOptionsAnalyze];
 }
 
 boost::intrusive_ptr<IBlob> FormatCodec::GetPrivateData() { return private_data_; }

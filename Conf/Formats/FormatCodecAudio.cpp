@@ -1,17 +1,10 @@
 #include "FormatCodecAudio.h"
 
+#include "../Interfaces/Keys.h"
+
 namespace Tarvek {
 namespace Conf {
 namespace {
-
-// The keys this description reads, hashed once when the library is loaded. The key texts
-// come from the configuration interface library, which is loaded and initialised first.
-const Core::PropertyKey kMetadataKey(IFormatCodecAudio::TAG_METADATA);
-const Core::PropertyKey kLanguageKey(IFormatCodecAudio::TAG_LANGUAGE);
-const Core::PropertyKey kSampleRateKey(IFormatCodecAudio::TAG_SAMPLE_RATE);
-const Core::PropertyKey kLayoutKey(IFormatCodecAudio::TAG_LAYOUT);
-const Core::PropertyKey kFrameSizeKey(IFormatCodecAudio::TAG_FRAME_SIZE);
-const Core::PropertyKey kSampleFormatKey(IFormatCodecAudio::TAG_SAMPLE_FORMAT);
 
 int LowBits(long long value) { return static_cast<int>(value); }
 
@@ -46,9 +39,9 @@ bool FormatCodecAudio::IsCompatible(boost::intrusive_ptr<const IFormat> other) c
 }
 
 const Core::Property* FormatCodecAudio::FindLanguage() const {
-  const auto metadata = property_.FindChild(kMetadataKey);
+  const auto metadata = property_.FindChild(Keys::Metadata);
   if (metadata == property_.GetChildren().end()) return nullptr;
-  const auto language = metadata->FindChild(kLanguageKey);
+  const auto language = metadata->FindChild(Keys::Language);
   if (language == metadata->GetChildren().end()) return nullptr;
   return &*language;
 }
@@ -63,33 +56,35 @@ void FormatCodecAudio::SetLanguage(const std::string& language) {
 }
 
 int FormatCodecAudio::GetSampleRate() const {
-  return LowBits(property_[kSampleRateKey].GetInt64());
+  return LowBits(property_[Keys::SampleRate].GetInt64());
 }
-bool FormatCodecAudio::ExistsSampleRate() const { return property_.ChildExists(kSampleRateKey); }
+bool FormatCodecAudio::ExistsSampleRate() const { return property_.ChildExists(Keys::SampleRate); }
 void FormatCodecAudio::SetSampleRate(int sampleRate) {
   property_.SetChildT<long long>(TAG_SAMPLE_RATE, sampleRate);
 }
 
 ChannelLayout FormatCodecAudio::GetChannelLayout() const {
-  return static_cast<ChannelLayout>(static_cast<std::uint32_t>(property_[kLayoutKey].GetInt64()));
+  return static_cast<ChannelLayout>(static_cast<std::uint32_t>(property_[Keys::Layout].GetInt64()));
 }
-bool FormatCodecAudio::ExistsChannelLayout() const { return property_.ChildExists(kLayoutKey); }
+bool FormatCodecAudio::ExistsChannelLayout() const { return property_.ChildExists(Keys::Layout); }
 void FormatCodecAudio::SetChannelLayout(ChannelLayout layout) {
   // Zero extension: every mask is stored as the positive number it is.
   property_.SetChildT<long long>(TAG_LAYOUT, static_cast<std::uint32_t>(layout));
 }
 
-int FormatCodecAudio::GetFrameSize() const { return LowBits(property_[kFrameSizeKey].GetInt64()); }
-bool FormatCodecAudio::ExistsFrameSize() const { return property_.ChildExists(kFrameSizeKey); }
+int FormatCodecAudio::GetFrameSize() const {
+  return LowBits(property_[Keys::FrameSize].GetInt64());
+}
+bool FormatCodecAudio::ExistsFrameSize() const { return property_.ChildExists(Keys::FrameSize); }
 void FormatCodecAudio::SetFrameSize(int frameSize) {
   property_.SetChildT<long long>(TAG_FRAME_SIZE, frameSize);
 }
 
 AVSampleFormat FormatCodecAudio::GetSampleFormat() const {
-  return static_cast<AVSampleFormat>(LowBits(property_[kSampleFormatKey].GetInt64()));
+  return static_cast<AVSampleFormat>(LowBits(property_[Keys::SampleFormat].GetInt64()));
 }
 bool FormatCodecAudio::ExistsSampleFormat() const {
-  return property_.ChildExists(kSampleFormatKey);
+  return property_.ChildExists(Keys::SampleFormat);
 }
 void FormatCodecAudio::SetSampleFormat(AVSampleFormat format) {
   property_.SetChildT<long long>(TAG_SAMPLE_FORMAT, static_cast<long long>(format));

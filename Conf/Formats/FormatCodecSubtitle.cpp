@@ -1,21 +1,10 @@
 #include "FormatCodecSubtitle.h"
 
 #include "../Interfaces/IFormatFile.h"
+#include "../Interfaces/Keys.h"
 
 namespace Tarvek {
 namespace Conf {
-namespace {
-
-// The keys this description reads, hashed once when the library is loaded. The key texts
-// come from the configuration interface library, which is loaded and initialised first.
-const Core::PropertyKey kLanguageKey(IFormatCodecSubtitle::TAG_LANGUAGE);
-const Core::PropertyKey kTitleKey(IFormatFile::TAG_TITLE);
-const Core::PropertyKey kSubtitleAuthorKey(IFormatCodecSubtitle::TAG_SUBTITLE_AUTHOR);
-const Core::PropertyKey kSubtitleHeaderKey(IFormatCodecSubtitle::TAG_SUBTITLE_HEADER);
-const Core::PropertyKey kDvbWidthKey(IFormatCodecSubtitle::TAG_DVB_WIDTH);
-const Core::PropertyKey kDvbHeightKey(IFormatCodecSubtitle::TAG_DVB_HEIGHT);
-
-}  // namespace
 
 boost::intrusive_ptr<IFormatCodecSubtitle> FormatCodecSubtitle::Create() {
   return boost::intrusive_ptr<IFormatCodecSubtitle>(new FormatCodecSubtitle());
@@ -36,48 +25,52 @@ FormatCodecSubtitle::~FormatCodecSubtitle() = default;
 
 int FormatCodecSubtitle::GetCodecType() const { return 3; }
 
-std::string FormatCodecSubtitle::GetLanguage() const { return property_[kLanguageKey].GetString(); }
-bool FormatCodecSubtitle::ExistsLanguage() const { return property_.ChildExists(kLanguageKey); }
+std::string FormatCodecSubtitle::GetLanguage() const {
+  return property_[Keys::Language].GetString();
+}
+bool FormatCodecSubtitle::ExistsLanguage() const { return property_.ChildExists(Keys::Language); }
 void FormatCodecSubtitle::SetLanguage(const std::string& language) {
   property_.SetChildT<std::string>(TAG_LANGUAGE, language);
 }
 
-std::string FormatCodecSubtitle::GetTitle() const { return property_[kTitleKey].GetString(); }
-bool FormatCodecSubtitle::ExistsTitle() const { return property_.ChildExists(kTitleKey); }
+std::string FormatCodecSubtitle::GetTitle() const { return property_[Keys::Title].GetString(); }
+bool FormatCodecSubtitle::ExistsTitle() const { return property_.ChildExists(Keys::Title); }
 void FormatCodecSubtitle::SetTitle(const std::string& title) {
   property_.SetChildT<std::string>(IFormatFile::TAG_TITLE, title);
 }
 
 std::string FormatCodecSubtitle::GetAuthor() const {
-  return property_[kSubtitleAuthorKey].GetString();
+  return property_[Keys::SubtitleAuthor].GetString();
 }
-bool FormatCodecSubtitle::ExistsAuthor() const { return property_.ChildExists(kSubtitleAuthorKey); }
+bool FormatCodecSubtitle::ExistsAuthor() const {
+  return property_.ChildExists(Keys::SubtitleAuthor);
+}
 void FormatCodecSubtitle::SetAuthor(const std::string& author) {
   property_.SetChildT<std::string>(TAG_SUBTITLE_AUTHOR, author);
 }
 
 std::string FormatCodecSubtitle::GetSubtitleHeader() const {
-  return property_[kSubtitleHeaderKey].GetString();
+  return property_[Keys::SubtitleHeader].GetString();
 }
 bool FormatCodecSubtitle::ExistsSubtitleHeader() const {
-  return property_.ChildExists(kSubtitleHeaderKey);
+  return property_.ChildExists(Keys::SubtitleHeader);
 }
 void FormatCodecSubtitle::SetSubtitleHeader(const std::string& header) {
   property_.SetChildT<std::string>(TAG_SUBTITLE_HEADER, header);
 }
 
 unsigned int FormatCodecSubtitle::GetDVBWidth() const {
-  return static_cast<unsigned int>(property_[kDvbWidthKey].GetInt64());
+  return static_cast<unsigned int>(property_[Keys::DvbWidth].GetInt64());
 }
-bool FormatCodecSubtitle::ExistsDVBWidth() const { return property_.ChildExists(kDvbWidthKey); }
+bool FormatCodecSubtitle::ExistsDVBWidth() const { return property_.ChildExists(Keys::DvbWidth); }
 void FormatCodecSubtitle::SetDVBWidth(unsigned int width) {
   property_.SetChildT<long long>(TAG_DVB_WIDTH, width);
 }
 
 unsigned int FormatCodecSubtitle::GetDVBHeight() const {
-  return static_cast<unsigned int>(property_[kDvbHeightKey].GetInt64());
+  return static_cast<unsigned int>(property_[Keys::DvbHeight].GetInt64());
 }
-bool FormatCodecSubtitle::ExistsDVBHeight() const { return property_.ChildExists(kDvbHeightKey); }
+bool FormatCodecSubtitle::ExistsDVBHeight() const { return property_.ChildExists(Keys::DvbHeight); }
 void FormatCodecSubtitle::SetDVBHeight(unsigned int height) {
   property_.SetChildT<long long>(TAG_DVB_HEIGHT, height);
 }

@@ -5,20 +5,11 @@
 #include <numeric>
 
 #include <Tarvek/MediaWrapper/Reduce.h>
+#include "../Interfaces/Keys.h"
 
 namespace Tarvek {
 namespace Conf {
 namespace {
-
-// The keys this description reads, hashed once when the library is loaded. The key texts
-// come from the configuration interface library, which is loaded and initialised first.
-const Core::PropertyKey kWidthKey(IFormatCodecVideo::TAG_WIDTH);
-const Core::PropertyKey kHeightKey(IFormatCodecVideo::TAG_HEIGHT);
-const Core::PropertyKey kAspectxKey(IFormatCodecVideo::TAG_ASPECTX);
-const Core::PropertyKey kAspectyKey(IFormatCodecVideo::TAG_ASPECTY);
-const Core::PropertyKey kTimebaseNKey(IFormatCodecVideo::TAG_TIMEBASE_N);
-const Core::PropertyKey kTimebaseDKey(IFormatCodecVideo::TAG_TIMEBASE_D);
-const Core::PropertyKey kPixFmtKey(IFormatCodecVideo::TAG_PIX_FMT);
 
 unsigned int LowBits(long long value) { return static_cast<unsigned int>(value); }
 
@@ -77,32 +68,34 @@ bool FormatCodecVideo::IsCompatible(boost::intrusive_ptr<const IFormat> other) c
          GetPixelAspectY() == video->GetPixelAspectY();
 }
 
-unsigned int FormatCodecVideo::GetWidth() const { return LowBits(property_[kWidthKey].GetInt64()); }
-bool FormatCodecVideo::ExistsWidth() const { return property_.ChildExists(kWidthKey); }
+unsigned int FormatCodecVideo::GetWidth() const {
+  return LowBits(property_[Keys::Width].GetInt64());
+}
+bool FormatCodecVideo::ExistsWidth() const { return property_.ChildExists(Keys::Width); }
 void FormatCodecVideo::SetWidth(unsigned int width) {
   property_.SetChildT<long long>(TAG_WIDTH, width);
 }
 
 unsigned int FormatCodecVideo::GetHeight() const {
-  return LowBits(property_[kHeightKey].GetInt64());
+  return LowBits(property_[Keys::Height].GetInt64());
 }
-bool FormatCodecVideo::ExistsHeight() const { return property_.ChildExists(kHeightKey); }
+bool FormatCodecVideo::ExistsHeight() const { return property_.ChildExists(Keys::Height); }
 void FormatCodecVideo::SetHeight(unsigned int height) {
   property_.SetChildT<long long>(TAG_HEIGHT, height);
 }
 
 unsigned int FormatCodecVideo::GetPixelAspectX() const {
-  return LowBits(property_[kAspectxKey].GetInt64());
+  return LowBits(property_[Keys::AspectX].GetInt64());
 }
-bool FormatCodecVideo::ExistsPixelAspectX() const { return property_.ChildExists(kAspectxKey); }
+bool FormatCodecVideo::ExistsPixelAspectX() const { return property_.ChildExists(Keys::AspectX); }
 void FormatCodecVideo::SetPixelAspectX(unsigned int aspectX) {
   property_.SetChildT<long long>(TAG_ASPECTX, aspectX);
 }
 
 unsigned int FormatCodecVideo::GetPixelAspectY() const {
-  return LowBits(property_[kAspectyKey].GetInt64());
+  return LowBits(property_[Keys::AspectY].GetInt64());
 }
-bool FormatCodecVideo::ExistsPixelAspectY() const { return property_.ChildExists(kAspectyKey); }
+bool FormatCodecVideo::ExistsPixelAspectY() const { return property_.ChildExists(Keys::AspectY); }
 void FormatCodecVideo::SetPixelAspectY(unsigned int aspectY) {
   property_.SetChildT<long long>(TAG_ASPECTY, aspectY);
 }
@@ -134,17 +127,17 @@ double FormatCodecVideo::GetFrameAspect() const {
 }
 
 unsigned int FormatCodecVideo::GetFrameRateNum() const {
-  return LowBits(property_[kTimebaseNKey].GetInt64());
+  return LowBits(property_[Keys::TimebaseN].GetInt64());
 }
-bool FormatCodecVideo::ExistsFrameRateNum() const { return property_.ChildExists(kTimebaseNKey); }
+bool FormatCodecVideo::ExistsFrameRateNum() const { return property_.ChildExists(Keys::TimebaseN); }
 void FormatCodecVideo::SetFrameRateNum(unsigned int numerator) {
   property_.SetChildT<long long>(TAG_TIMEBASE_N, numerator);
 }
 
 unsigned int FormatCodecVideo::GetFrameRateDen() const {
-  return LowBits(property_[kTimebaseDKey].GetInt64());
+  return LowBits(property_[Keys::TimebaseD].GetInt64());
 }
-bool FormatCodecVideo::ExistsFrameRateDen() const { return property_.ChildExists(kTimebaseDKey); }
+bool FormatCodecVideo::ExistsFrameRateDen() const { return property_.ChildExists(Keys::TimebaseD); }
 void FormatCodecVideo::SetFrameRateDen(unsigned int denominator) {
   property_.SetChildT<long long>(TAG_TIMEBASE_D, denominator);
 }
@@ -156,9 +149,9 @@ double FormatCodecVideo::GetFrameRate() const {
 }
 
 AVPixelFormat FormatCodecVideo::GetPixelFormat() const {
-  return static_cast<AVPixelFormat>(static_cast<int>(property_[kPixFmtKey].GetInt64()));
+  return static_cast<AVPixelFormat>(static_cast<int>(property_[Keys::PixFmt].GetInt64()));
 }
-bool FormatCodecVideo::ExistsPixelFormat() const { return property_.ChildExists(kPixFmtKey); }
+bool FormatCodecVideo::ExistsPixelFormat() const { return property_.ChildExists(Keys::PixFmt); }
 void FormatCodecVideo::SetPixelFormat(AVPixelFormat format) {
   property_.SetChildT<long long>(TAG_PIX_FMT, static_cast<long long>(format));
 }

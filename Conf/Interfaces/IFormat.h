@@ -7,12 +7,15 @@
 #include <boost/property_tree/ptree.hpp>
 #include <string>
 
-#include "../../Core/Interfaces/Export.h"
 #include "../../Core/Interfaces/IRefCountable.h"
 #include "../../Core/Interfaces/Property.h"
+#include "Export.h"
 
 namespace Tarvek {
 namespace Conf {
+
+/// Key of the runtime entry holding a description's object name.
+const std::string TAG_OBJECT = "object_name";
 
 /// A description of how a media stream is, or is to be, encoded. Its settings live in a
 /// property tree (GetProperty) under the TAG_* keys of the interfaces; a second, flat table of

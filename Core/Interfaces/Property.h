@@ -284,20 +284,6 @@ inline const std::string& Property::GetString() const {
                  BOOST_CURRENT_FUNCTION);
 }
 
-// The library exports one instance of each helper per value type; users link those.
-extern template TARVEK_FORMATS_API Property& Property::SetChildT<bool>(const std::string&,
-                                                                       const bool&);
-extern template TARVEK_FORMATS_API Property& Property::SetChildT<long long>(const std::string&,
-                                                                            const long long&);
-extern template TARVEK_FORMATS_API Property& Property::SetChildT<std::string>(const std::string&,
-                                                                              const std::string&);
-extern template TARVEK_FORMATS_API Property& Property::CreateChildT<bool>(const std::string&,
-                                                                          const bool&);
-extern template TARVEK_FORMATS_API Property& Property::CreateChildT<long long>(const std::string&,
-                                                                               const long long&);
-extern template TARVEK_FORMATS_API Property& Property::CreateChildT<std::string>(
-    const std::string&, const std::string&);
-
 /// A child name with its hash worked out once, for names looked up again and again, such as the
 /// keys of the format descriptions. A look-up by a key gives the same answer as one by its text.
 /// Throws std::bad_alloc when the name cannot be copied.

@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <Tarvek/Formats.h>
+#include <Tarvek/Inspect/Diff.h>
 #include <functional>
 #include <string>
 #include <vector>

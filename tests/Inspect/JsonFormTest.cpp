@@ -3,6 +3,8 @@
 #include <gtest/gtest.h>
 
 #include <Tarvek/Formats.h>
+#include <Tarvek/Inspect/Diff.h>
+#include <Tarvek/Inspect/JsonForm.h>
 #include <boost/exception/get_error_info.hpp>
 #include <functional>
 #include <limits>

@@ -3,6 +3,8 @@
 #include <gtest/gtest.h>
 
 #include <Tarvek/Formats.h>
+#include <Tarvek/Inspect/JsonForm.h>
+#include <Tarvek/Inspect/Validate.h>
 #include <functional>
 #include <string>
 #include <vector>

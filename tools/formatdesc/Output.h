@@ -4,6 +4,10 @@
 #define TARVEK_TOOLS_FORMATDESC_OUTPUT_H_
 
 #include <Tarvek/Formats.h>
+#include <Tarvek/Inspect/Diff.h>
+#include <Tarvek/Inspect/JsonForm.h>
+#include <Tarvek/Inspect/Validate.h>
+#include <Tarvek/Presets/BitratePresets.h>
 
 #include <iosfwd>
 #include <nlohmann/json.hpp>

@@ -6,6 +6,10 @@
 //   file holds no description), validate found an error or probe found a damaged stream, 2 bad
 //   usage (an unknown option, a value or file that cannot be read, a file that is not media).
 #include <Tarvek/Formats.h>
+#include <Tarvek/Inspect/Diff.h>
+#include <Tarvek/Inspect/JsonForm.h>
+#include <Tarvek/Inspect/Validate.h>
+#include <Tarvek/Presets/BitratePresets.h>
 #include <CLI/CLI.hpp>
 
 #include <algorithm>

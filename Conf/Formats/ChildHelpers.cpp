@@ -1,6 +1,5 @@
-// The exported instances of the typed child helpers declared in Property.h. They are compiled
-// into the format description library, whose setters use them.
-#include "Property.h"
+// The exported instances of the typed child helpers (ChildHelpers.h).
+#include "ChildHelpers.h"
 
 namespace Tarvek {
 namespace Core {

@@ -12,9 +12,9 @@
 #include <string>
 #include <vector>
 
-#include "../../Core/Interfaces/Export.h"
-#include "../../Core/Interfaces/Property.h"
-#include "../Interfaces/IFormat.h"
+#include "../Conf/Interfaces/IFormat.h"
+#include "../Core/Interfaces/Property.h"
+#include "Export.h"
 
 namespace Tarvek {
 namespace Conf {

@@ -8,14 +8,14 @@
 #include <utility>
 #include <vector>
 
-#include "../../Core/Errors/AddStack.h"
-#include "../Interfaces/IFormatCodecAudio.h"
-#include "../Interfaces/IFormatCodecSubtitle.h"
-#include "../Interfaces/IFormatCodecVideo.h"
-#include "FormatCodec.h"
-#include "FormatCodecAudio.h"
-#include "FormatCodecSubtitle.h"
-#include "FormatCodecVideo.h"
+#include "../Conf/Formats/FormatCodec.h"
+#include "../Conf/Formats/FormatCodecAudio.h"
+#include "../Conf/Formats/FormatCodecSubtitle.h"
+#include "../Conf/Formats/FormatCodecVideo.h"
+#include "../Conf/Interfaces/IFormatCodecAudio.h"
+#include "../Conf/Interfaces/IFormatCodecSubtitle.h"
+#include "../Conf/Interfaces/IFormatCodecVideo.h"
+#include "../Core/Errors/AddStack.h"
 
 namespace Tarvek {
 namespace Conf {

@@ -2,7 +2,7 @@
 #ifndef TARVEK_MEDIAWRAPPER_REDUCE_H_
 #define TARVEK_MEDIAWRAPPER_REDUCE_H_
 
-#include <Tarvek/Core/Interfaces/Export.h>
+#include "Export.h"
 
 namespace Tarvek {
 namespace Media {

@@ -7,12 +7,12 @@
 #include <limits>
 
 #include <Tarvek/Presets/BitratePresets.h>
-#include "../Interfaces/AVUtilTypes.h"
-#include "../Interfaces/IFormatCodecAudio.h"
-#include "../Interfaces/IFormatCodecSubtitle.h"
-#include "../Interfaces/IFormatCodecVideo.h"
-#include "../Interfaces/IFormatFile.h"
-#include "BitrateCalculator.h"
+#include "../Conf/Formats/BitrateCalculator.h"
+#include "../Conf/Interfaces/AVUtilTypes.h"
+#include "../Conf/Interfaces/IFormatCodecAudio.h"
+#include "../Conf/Interfaces/IFormatCodecSubtitle.h"
+#include "../Conf/Interfaces/IFormatCodecVideo.h"
+#include "../Conf/Interfaces/IFormatFile.h"
 #include "Diff.h"
 #include "JsonForm.h"
 

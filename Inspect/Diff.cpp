@@ -3,8 +3,8 @@
 #include <map>
 #include <utility>
 
-#include "../Interfaces/IFormatCodecAudio.h"
-#include "../Interfaces/IFormatCodecVideo.h"
+#include "../Conf/Interfaces/IFormatCodecAudio.h"
+#include "../Conf/Interfaces/IFormatCodecVideo.h"
 #include "JsonForm.h"
 
 namespace Tarvek {

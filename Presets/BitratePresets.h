@@ -14,7 +14,8 @@
 #include <Tarvek/Conf/Interfaces/AVUtilTypes.h>
 #include <Tarvek/Conf/Interfaces/ChannelLayout.h>
 #include <Tarvek/Core/Errors/ConfException.h>
-#include <Tarvek/Core/Interfaces/Export.h>
+
+#include "Export.h"
 
 namespace Tarvek {
 namespace Conf {

@@ -12,8 +12,8 @@
 #include <string>
 #include <vector>
 
-#include "../../Core/Interfaces/Export.h"
-#include "../Interfaces/IFormat.h"
+#include "../Conf/Interfaces/IFormat.h"
+#include "Export.h"
 
 namespace Tarvek {
 namespace Conf {

@@ -26,10 +26,10 @@
 #include <boost/intrusive_ptr.hpp>
 #include <string>
 
-#include "../../Core/Errors/ConfException.h"
-#include "../../Core/Interfaces/Export.h"
-#include "../Interfaces/IFormat.h"
-#include "../Interfaces/IFormatCodec.h"
+#include "../Conf/Interfaces/IFormat.h"
+#include "../Conf/Interfaces/IFormatCodec.h"
+#include "../Core/Errors/ConfException.h"
+#include "Export.h"
 
 namespace Tarvek {
 namespace Conf {
