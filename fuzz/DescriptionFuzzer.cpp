@@ -31,7 +31,7 @@
 #include <Tarvek/Presets/BitratePresets.h>
 #include <boost/exception/get_error_info.hpp>
 
-#include "../tests/Support/CountingBlob.h"
+#include "Support/CountingBlob.h"
 
 namespace {
 
