@@ -5,36 +5,19 @@
 
 #include "../Conf/Interfaces/IFormatCodecAudio.h"
 #include "../Conf/Interfaces/IFormatCodecVideo.h"
+#include "../Core/Interfaces/EscapedText.h"
 #include "JsonForm.h"
+#include "Settings.h"
 
 namespace Tarvek {
 namespace Conf {
 namespace {
 
-// `text` between double quotes, with quotes, backslashes and control bytes escaped as
-// PrintPropertyValue escapes them, so that the extent of a value is never in doubt.
+// `text` between double quotes, escaped as PrintPropertyValue escapes it, so that the extent of a
+// value is never in doubt.
 std::string Quoted(const std::string& text) {
-  static const char kHex[] = "0123456789abcdef";
   std::string out = "\"";
-  for (const char c : text) {
-    const auto byte = static_cast<unsigned char>(c);
-    if (c == '"' || c == '\\') {
-      out += '\\';
-      out += c;
-    } else if (c == '\n') {
-      out += "\\n";
-    } else if (c == '\r') {
-      out += "\\r";
-    } else if (c == '\t') {
-      out += "\\t";
-    } else if (byte < 0x20 || byte == 0x7f) {
-      out += "\\x";
-      out += kHex[byte >> 4];
-      out += kHex[byte & 0xf];
-    } else {
-      out += c;
-    }
-  }
+  Core::AppendEscaped(out, text);
   return out + "\"";
 }
 
@@ -136,11 +119,8 @@ void DiffNodes(const Core::Property& a, const Core::Property& b, const std::stri
 
 // "an audio description" and the like, for sentences about the kind of a description.
 std::string KindPhrase(const boost::intrusive_ptr<const IFormat>& description) {
-  const std::string kind = DescriptionKind(description);
-  if (kind == "audio") return "an audio description";
-  if (kind == "codec") return "a generic codec description";
-  if (kind.empty()) return "a description of no codec kind";
-  return "a " + kind + " description";
+  const std::optional<FormatKind> kind = KindOf(description.get());
+  return kind ? Conf::KindPhrase(*kind) : "a description of no codec kind";
 }
 
 // What the compatibility test reads of one setting on one side.
@@ -208,7 +188,7 @@ const Kind* SameKind(const boost::intrusive_ptr<const IFormat>& a,
 void ExplainVideo(const IFormatCodecVideo& a, const boost::intrusive_ptr<const IFormat>& pa,
                   const boost::intrusive_ptr<const IFormat>& pb,
                   std::vector<Incompatibility>& out) {
-  const auto* b = SameKind<IFormatCodecVideo>(pa, pb, "video", out);
+  const auto* b = SameKind<IFormatCodecVideo>(pa, pb, KindName(FormatKind::Video), out);
   if (b == nullptr) return;
   Explain(IFormatCodecVideo::TAG_WIDTH, "width",
           Read(a, IFormatCodecVideo::TAG_WIDTH, [&] { return a.GetWidth(); }),
@@ -227,7 +207,7 @@ void ExplainVideo(const IFormatCodecVideo& a, const boost::intrusive_ptr<const I
 void ExplainAudio(const IFormatCodecAudio& a, const boost::intrusive_ptr<const IFormat>& pa,
                   const boost::intrusive_ptr<const IFormat>& pb,
                   std::vector<Incompatibility>& out) {
-  const auto* b = SameKind<IFormatCodecAudio>(pa, pb, "audio", out);
+  const auto* b = SameKind<IFormatCodecAudio>(pa, pb, KindName(FormatKind::Audio), out);
   if (b == nullptr) return;
   Explain(IFormatCodecAudio::TAG_SAMPLE_RATE, "sample rate",
           Read(a, IFormatCodecAudio::TAG_SAMPLE_RATE, [&] { return a.GetSampleRate(); }),

@@ -16,6 +16,8 @@
 #include "../Conf/Interfaces/IFormatCodecSubtitle.h"
 #include "../Conf/Interfaces/IFormatCodecVideo.h"
 #include "../Core/Errors/AddStack.h"
+#include "JsonLayout.h"
+#include "Settings.h"
 
 namespace Tarvek {
 namespace Conf {
@@ -29,8 +31,6 @@ constexpr const char* kFormatName = "tarvek-description";
 // A node at level L of the tree (or of the runtime entries) sits 2L deep in the document, its
 // "children" array one deeper; nothing deeper than that is needed.
 constexpr int kMaxNesting = 2 * kJsonFormMaxDepth + 1;
-// Objects and arrays of plain values are written on one line when it stays this short.
-constexpr std::size_t kLineWidth = 100;
 
 // ----- Errors -------------------------------------------------------------------------------
 
@@ -256,55 +256,6 @@ Json EntryJson(const Entries& entry, const std::string* key, int level) {
   return json;
 }
 
-// `value` on one line, with ", " and ": " between items.
-std::string OneLine(const Json& value) {
-  if (!value.is_structured() || value.empty()) return value.dump();
-  std::string line(1, value.is_object() ? '{' : '[');
-  bool first = true;
-  for (const auto& item : value.items()) {
-    if (!first) line += ", ";
-    first = false;
-    if (value.is_object()) line += Json(item.key()).dump() + ": ";
-    line += OneLine(item.value());
-  }
-  return line + (value.is_object() ? '}' : ']');
-}
-
-bool HoldsOnlyPlainValues(const Json& value) {
-  for (const auto& element : value) {
-    if (element.is_structured() && !element.empty()) return false;
-  }
-  return true;
-}
-
-// Indented by two; an object or array of plain values stays on one line when it fits, so that a
-// node of the tree reads as one line and a stored description diffs line by line.
-void Write(const Json& value, std::size_t indent, std::size_t column, std::string& out) {
-  if (!value.is_structured() || value.empty()) {
-    out += value.dump();
-    return;
-  }
-  if (HoldsOnlyPlainValues(value)) {
-    const std::string line = OneLine(value);
-    if (column + line.size() <= kLineWidth) {
-      out += line;
-      return;
-    }
-  }
-  const std::string pad(indent + 2, ' ');
-  out += value.is_object() ? "{\n" : "[\n";
-  bool first = true;
-  for (const auto& item : value.items()) {
-    if (!first) out += ",\n";
-    first = false;
-    out += pad;
-    const std::string key = value.is_object() ? Json(item.key()).dump() + ": " : std::string();
-    out += key;
-    Write(item.value(), indent + 2, pad.size() + key.size(), out);
-  }
-  out += "\n" + std::string(indent, ' ') + (value.is_object() ? '}' : ']');
-}
-
 // ----- Reading ------------------------------------------------------------------------------
 
 const Json& Require(const Json& object, const std::string& pointer, const std::string& member) {
@@ -486,10 +437,17 @@ boost::intrusive_ptr<IFormatCodec> CreateOfKind(const Json& document) {
   const Json& kind = Require(document, "", "kind");
   if (!kind.is_string()) Fail("/kind", "expected a string, found " + Found(kind));
   const std::string& name = kind.get_ref<const std::string&>();
-  if (name == "codec") return FormatCodec::Create();
-  if (name == "video") return FormatCodecVideo::Create();
-  if (name == "audio") return FormatCodecAudio::Create();
-  if (name == "subtitle") return FormatCodecSubtitle::Create();
+  switch (KindFromName(name).value_or(FormatKind::Codec)) {
+    case FormatKind::Video:
+      return FormatCodecVideo::Create();
+    case FormatKind::Audio:
+      return FormatCodecAudio::Create();
+    case FormatKind::Subtitle:
+      return FormatCodecSubtitle::Create();
+    case FormatKind::Codec:
+      if (name == KindName(FormatKind::Codec)) return FormatCodec::Create();
+      break;
+  }
   Fail("/kind", "unknown kind " + Quote(name) +
                     "; expected \"codec\", \"video\", \"audio\" or \"subtitle\"");
 }
@@ -497,12 +455,8 @@ boost::intrusive_ptr<IFormatCodec> CreateOfKind(const Json& document) {
 }  // namespace
 
 const char* DescriptionKind(const boost::intrusive_ptr<const IFormat>& description) noexcept {
-  const IFormat* format = description.get();
-  if (dynamic_cast<const IFormatCodecVideo*>(format) != nullptr) return "video";
-  if (dynamic_cast<const IFormatCodecAudio*>(format) != nullptr) return "audio";
-  if (dynamic_cast<const IFormatCodecSubtitle*>(format) != nullptr) return "subtitle";
-  if (dynamic_cast<const IFormatCodec*>(format) != nullptr) return "codec";
-  return "";
+  const std::optional<FormatKind> kind = KindOf(description.get());
+  return kind ? KindName(*kind) : "";
 }
 
 std::string ToJson(const boost::intrusive_ptr<IFormatCodec>& description) {
@@ -520,7 +474,7 @@ std::string ToJson(const boost::intrusive_ptr<IFormatCodec>& description) {
   document["private_data"] =
       data ? Json(EncodeBase64(data->GetData(), data->GetSize())) : Json(nullptr);
   std::string text;
-  Write(document, 0, 0, text);
+  JsonLayout::Write(document, text);
   return text;
 }
 

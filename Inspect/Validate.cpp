@@ -10,11 +10,10 @@
 #include "../Conf/Formats/BitrateCalculator.h"
 #include "../Conf/Interfaces/AVUtilTypes.h"
 #include "../Conf/Interfaces/IFormatCodecAudio.h"
-#include "../Conf/Interfaces/IFormatCodecSubtitle.h"
 #include "../Conf/Interfaces/IFormatCodecVideo.h"
-#include "../Conf/Interfaces/IFormatFile.h"
 #include "Diff.h"
 #include "JsonForm.h"
+#include "Settings.h"
 
 namespace Tarvek {
 namespace Conf {
@@ -22,67 +21,6 @@ namespace {
 
 using Video = IFormatCodecVideo;
 using Audio = IFormatCodecAudio;
-using Subtitle = IFormatCodecSubtitle;
-
-// The range of the integer an accessor makes of a stored int64.
-enum class Range { Int64, Unsigned32, Signed32 };
-
-// A key the description's kind knows, with the type and range its accessors read. `parent` is
-// "" for a child of the root, or the container it lives in (the audio language lives in the
-// metadata).
-struct Known {
-  std::string parent;
-  std::string key;
-  PropertyTypes type;
-  Range range;
-};
-
-std::vector<Known> KnownKeys(const std::string& kind) {
-  std::vector<Known> keys = {{"", IFormat::TAG_METADATA, PropertyTypeContainer, Range::Int64}};
-  if (kind.empty()) return keys;
-  const std::vector<Known> codec = {
-      {"", IFormatCodec::TAG_NAME, PropertyTypeString, Range::Int64},
-      {"", IFormatCodec::TAG_CODEC_ID, PropertyTypeString, Range::Int64},
-      {"", IFormatCodec::TAG_FOURCC, PropertyTypeInt64, Range::Int64},
-      {"", IFormatCodec::TAG_BITRATE_MODE, PropertyTypeString, Range::Int64},
-      {"", IFormatCodec::TAG_BITRATE, PropertyTypeInt64, Range::Int64},
-      {"", IFormatCodec::TAG_QUALITY, PropertyTypeInt64, Range::Int64},
-      {"", IFormatCodec::TAG_LOSSLESS, PropertyTypeBool, Range::Int64},
-      {"", IFormatCodec::TAG_THREAD_NUMBER, PropertyTypeInt64, Range::Unsigned32},
-      {"", IFormatCodec::TAG_TWO_PASS_ENCODING, PropertyTypeBool, Range::Int64},
-      {"", IFormatCodec::TAG_GLOBAL_HEADER, PropertyTypeBool, Range::Int64},
-      {"", IFormatCodec::TAG_MAIN_STREAM, PropertyTypeBool, Range::Int64},
-      {"", IFormatCodec::TAG_CODEC_OPTIONS_ENCODE, PropertyTypeContainer, Range::Int64},
-      {"", IFormatCodec::TAG_CODEC_OPTIONS_ANALYZE, PropertyTypeContainer, Range::Int64},
-  };
-  keys.insert(keys.end(), codec.begin(), codec.end());
-  std::vector<Known> own;
-  // Pixel and sample formats are checked against libavutil's enumeration instead of a range.
-  if (kind == "video") {
-    own = {{"", Video::TAG_WIDTH, PropertyTypeInt64, Range::Unsigned32},
-           {"", Video::TAG_HEIGHT, PropertyTypeInt64, Range::Unsigned32},
-           {"", Video::TAG_ASPECTX, PropertyTypeInt64, Range::Unsigned32},
-           {"", Video::TAG_ASPECTY, PropertyTypeInt64, Range::Unsigned32},
-           {"", Video::TAG_TIMEBASE_N, PropertyTypeInt64, Range::Unsigned32},
-           {"", Video::TAG_TIMEBASE_D, PropertyTypeInt64, Range::Unsigned32},
-           {"", Video::TAG_PIX_FMT, PropertyTypeInt64, Range::Int64}};
-  } else if (kind == "audio") {
-    own = {{IFormat::TAG_METADATA, IFormatCodec::TAG_LANGUAGE, PropertyTypeString, Range::Int64},
-           {"", Audio::TAG_SAMPLE_RATE, PropertyTypeInt64, Range::Signed32},
-           {"", Audio::TAG_LAYOUT, PropertyTypeInt64, Range::Unsigned32},
-           {"", Audio::TAG_FRAME_SIZE, PropertyTypeInt64, Range::Signed32},
-           {"", Audio::TAG_SAMPLE_FORMAT, PropertyTypeInt64, Range::Int64}};
-  } else if (kind == "subtitle") {
-    own = {{"", IFormatCodec::TAG_LANGUAGE, PropertyTypeString, Range::Int64},
-           {"", IFormatFile::TAG_TITLE, PropertyTypeString, Range::Int64},
-           {"", Subtitle::TAG_SUBTITLE_AUTHOR, PropertyTypeString, Range::Int64},
-           {"", Subtitle::TAG_SUBTITLE_HEADER, PropertyTypeString, Range::Int64},
-           {"", Subtitle::TAG_DVB_WIDTH, PropertyTypeInt64, Range::Unsigned32},
-           {"", Subtitle::TAG_DVB_HEIGHT, PropertyTypeInt64, Range::Unsigned32}};
-  }
-  keys.insert(keys.end(), own.begin(), own.end());
-  return keys;
-}
 
 // The settings under review, read without a getter, so that nothing the tree holds can throw.
 class Review {
@@ -124,12 +62,12 @@ class Review {
   std::vector<Finding>& findings_;
 };
 
-std::string PathOf(const Known& known) {
+std::string PathOf(const Setting& known) {
   return known.parent.empty() ? known.key : known.parent + "/" + known.key;
 }
 
-void CheckTypesAndRanges(Review& review, const std::vector<Known>& keys) {
-  for (const Known& known : keys) {
+void CheckTypesAndRanges(Review& review, const std::vector<Setting>& keys) {
+  for (const Setting& known : keys) {
     const Core::Property* node = review.Find(known.parent, known.key);
     if (node == nullptr) continue;
     const std::string path = PathOf(known);
@@ -140,9 +78,9 @@ void CheckTypesAndRanges(Review& review, const std::vector<Known>& keys) {
                      PropertyTypeName(known.type));
       continue;
     }
-    if (known.range == Range::Int64) continue;
+    if (known.range == ValueRange::Int64) continue;
     const long long value = node->GetInt64();
-    const bool isUnsigned = known.range == Range::Unsigned32;
+    const bool isUnsigned = known.range == ValueRange::Unsigned32;
     const long long low = isUnsigned ? 0 : std::numeric_limits<std::int32_t>::min();
     const long long high = isUnsigned ? std::numeric_limits<std::uint32_t>::max()
                                       : std::numeric_limits<std::int32_t>::max();
@@ -179,11 +117,10 @@ bool Knows(const std::vector<std::string>& ids, const std::string& id) {
   return std::find(ids.begin(), ids.end(), Lower(id)) != ids.end();
 }
 
-void CheckCodecId(Review& review, const std::string& kind) {
+void CheckCodecId(Review& review, bool video) {
   const Core::Property* node = review.Find("", IFormatCodec::TAG_CODEC_ID);
   if (node == nullptr || node->GetType() != PropertyTypeString) return;
   const std::string& id = node->GetString();
-  const bool video = kind == "video";
   const auto& own = video ? GetPresetVideoCodecs() : GetPresetAudioCodecs();
   const auto& other = video ? GetPresetAudioCodecs() : GetPresetVideoCodecs();
   if (Knows(own, id)) return;
@@ -220,7 +157,7 @@ void CheckVideo(Review& review) {
   }
   CheckPresent(review, {Video::TAG_ASPECTX, Video::TAG_ASPECTY}, Severity::Warning,
                "the frame aspect and the compatibility test need it");
-  CheckCodecId(review, "video");
+  CheckCodecId(review, true);
   CheckNotZero(review, Video::TAG_WIDTH, "the width is 0");
   CheckNotZero(review, Video::TAG_HEIGHT, "the height is 0");
   CheckNotZero(review, Video::TAG_ASPECTX, "the pixel aspect X (sample_aspect_num) is 0");
@@ -235,7 +172,7 @@ void CheckAudio(Review& review) {
                {IFormatCodec::TAG_CODEC_ID, Audio::TAG_SAMPLE_RATE, Audio::TAG_LAYOUT,
                 Audio::TAG_SAMPLE_FORMAT},
                Severity::Error, "the bitrate functions need it");
-  CheckCodecId(review, "audio");
+  CheckCodecId(review, false);
   CheckNotZero(review, Audio::TAG_LAYOUT, "the channel layout is 0: it names no speaker");
   CheckEnumeration(review, Audio::TAG_SAMPLE_FORMAT, AV_SAMPLE_FMT_NB, "a sample format");
 }
@@ -282,11 +219,16 @@ std::vector<Finding> Validate(const boost::intrusive_ptr<const IFormat>& descrip
     findings.push_back({Severity::Error, "", "there is no description (a null pointer)"});
     return findings;
   }
-  const std::string kind = DescriptionKind(description);
+  const std::optional<FormatKind> kind = KindOf(description.get());
   Review review(description->GetProperty(), findings);
-  CheckTypesAndRanges(review, KnownKeys(kind));
-  if (kind == "video" || kind == "audio") {
-    const bool video = kind == "video";
+  if (!kind) {
+    // Only the metadata child is known of a description that is no codec.
+    CheckTypesAndRanges(review, {SettingsOf(FormatKind::Codec).front()});
+    return findings;
+  }
+  CheckTypesAndRanges(review, SettingsOf(*kind));
+  if (kind == FormatKind::Video || kind == FormatKind::Audio) {
+    const bool video = kind == FormatKind::Video;
     if (video) {
       CheckVideo(review);
     } else {

@@ -6,7 +6,8 @@ namespace Tarvek {
 namespace Conf {
 namespace {
 
-int LowBits(long long value) { return static_cast<int>(value); }
+// The low 32 bits of a stored value, as the signed accessors return them.
+int LowBitsAsInt(long long value) { return static_cast<int>(value); }
 
 }  // namespace
 
@@ -38,25 +39,21 @@ bool FormatCodecAudio::IsCompatible(boost::intrusive_ptr<const IFormat> other) c
          GetSampleFormat() == audio->GetSampleFormat();
 }
 
-const Core::Property* FormatCodecAudio::FindLanguage() const {
-  const auto metadata = property_.FindChild(Keys::Metadata);
-  if (metadata == property_.GetChildren().end()) return nullptr;
-  const auto language = metadata->FindChild(Keys::Language);
-  if (language == metadata->GetChildren().end()) return nullptr;
-  return &*language;
-}
-
 std::string FormatCodecAudio::GetLanguage() const {
-  const Core::Property* language = FindLanguage();
-  return language == nullptr ? std::string() : language->GetString();
+  // Asks ExistsLanguage through virtual dispatch, so that a subclass overriding it decides.
+  if (!ExistsLanguage()) return std::string();
+  return property_[Keys::Metadata][Keys::Language].GetString();
 }
-bool FormatCodecAudio::ExistsLanguage() const { return FindLanguage() != nullptr; }
+bool FormatCodecAudio::ExistsLanguage() const {
+  const auto metadata = property_.FindChild(Keys::Metadata);
+  return metadata != property_.GetChildren().end() && metadata->ChildExists(Keys::Language);
+}
 void FormatCodecAudio::SetLanguage(const std::string& language) {
   property_[TAG_METADATA].SetChildT<std::string>(TAG_LANGUAGE, language);
 }
 
 int FormatCodecAudio::GetSampleRate() const {
-  return LowBits(property_[Keys::SampleRate].GetInt64());
+  return LowBitsAsInt(property_[Keys::SampleRate].GetInt64());
 }
 bool FormatCodecAudio::ExistsSampleRate() const { return property_.ChildExists(Keys::SampleRate); }
 void FormatCodecAudio::SetSampleRate(int sampleRate) {
@@ -73,7 +70,7 @@ void FormatCodecAudio::SetChannelLayout(ChannelLayout layout) {
 }
 
 int FormatCodecAudio::GetFrameSize() const {
-  return LowBits(property_[Keys::FrameSize].GetInt64());
+  return LowBitsAsInt(property_[Keys::FrameSize].GetInt64());
 }
 bool FormatCodecAudio::ExistsFrameSize() const { return property_.ChildExists(Keys::FrameSize); }
 void FormatCodecAudio::SetFrameSize(int frameSize) {
@@ -81,7 +78,7 @@ void FormatCodecAudio::SetFrameSize(int frameSize) {
 }
 
 AVSampleFormat FormatCodecAudio::GetSampleFormat() const {
-  return static_cast<AVSampleFormat>(LowBits(property_[Keys::SampleFormat].GetInt64()));
+  return static_cast<AVSampleFormat>(LowBitsAsInt(property_[Keys::SampleFormat].GetInt64()));
 }
 bool FormatCodecAudio::ExistsSampleFormat() const {
   return property_.ChildExists(Keys::SampleFormat);

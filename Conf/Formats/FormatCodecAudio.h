@@ -59,10 +59,6 @@ class TARVEK_FORMATS_API FormatCodecAudio : public virtual IFormatCodecAudio,
   void SetSampleFormat(AVSampleFormat format) override;
 
   boost::intrusive_ptr<IFormatCodecAudio> Clone() const override;
-
- private:
-  // The language child, or null when the metadata or the language is missing.
-  const Core::Property* FindLanguage() const;
 };
 
 }  // namespace Conf

@@ -11,7 +11,8 @@ namespace Tarvek {
 namespace Conf {
 namespace {
 
-unsigned int LowBits(long long value) { return static_cast<unsigned int>(value); }
+// The low 32 bits of a stored value, as the unsigned accessors return them.
+unsigned int LowBitsAsUnsigned(long long value) { return static_cast<unsigned int>(value); }
 
 // Reduces (a x b) : (c x d) to lowest terms. The products are exact in 64 bits, so a large
 // size times a large aspect term no longer wraps; a reduced term beyond 32 bits keeps its low
@@ -69,7 +70,7 @@ bool FormatCodecVideo::IsCompatible(boost::intrusive_ptr<const IFormat> other) c
 }
 
 unsigned int FormatCodecVideo::GetWidth() const {
-  return LowBits(property_[Keys::Width].GetInt64());
+  return LowBitsAsUnsigned(property_[Keys::Width].GetInt64());
 }
 bool FormatCodecVideo::ExistsWidth() const { return property_.ChildExists(Keys::Width); }
 void FormatCodecVideo::SetWidth(unsigned int width) {
@@ -77,7 +78,7 @@ void FormatCodecVideo::SetWidth(unsigned int width) {
 }
 
 unsigned int FormatCodecVideo::GetHeight() const {
-  return LowBits(property_[Keys::Height].GetInt64());
+  return LowBitsAsUnsigned(property_[Keys::Height].GetInt64());
 }
 bool FormatCodecVideo::ExistsHeight() const { return property_.ChildExists(Keys::Height); }
 void FormatCodecVideo::SetHeight(unsigned int height) {
@@ -85,7 +86,7 @@ void FormatCodecVideo::SetHeight(unsigned int height) {
 }
 
 unsigned int FormatCodecVideo::GetPixelAspectX() const {
-  return LowBits(property_[Keys::AspectX].GetInt64());
+  return LowBitsAsUnsigned(property_[Keys::AspectX].GetInt64());
 }
 bool FormatCodecVideo::ExistsPixelAspectX() const { return property_.ChildExists(Keys::AspectX); }
 void FormatCodecVideo::SetPixelAspectX(unsigned int aspectX) {
@@ -93,7 +94,7 @@ void FormatCodecVideo::SetPixelAspectX(unsigned int aspectX) {
 }
 
 unsigned int FormatCodecVideo::GetPixelAspectY() const {
-  return LowBits(property_[Keys::AspectY].GetInt64());
+  return LowBitsAsUnsigned(property_[Keys::AspectY].GetInt64());
 }
 bool FormatCodecVideo::ExistsPixelAspectY() const { return property_.ChildExists(Keys::AspectY); }
 void FormatCodecVideo::SetPixelAspectY(unsigned int aspectY) {
@@ -127,7 +128,7 @@ double FormatCodecVideo::GetFrameAspect() const {
 }
 
 unsigned int FormatCodecVideo::GetFrameRateNum() const {
-  return LowBits(property_[Keys::TimebaseN].GetInt64());
+  return LowBitsAsUnsigned(property_[Keys::TimebaseN].GetInt64());
 }
 bool FormatCodecVideo::ExistsFrameRateNum() const { return property_.ChildExists(Keys::TimebaseN); }
 void FormatCodecVideo::SetFrameRateNum(unsigned int numerator) {
@@ -135,7 +136,7 @@ void FormatCodecVideo::SetFrameRateNum(unsigned int numerator) {
 }
 
 unsigned int FormatCodecVideo::GetFrameRateDen() const {
-  return LowBits(property_[Keys::TimebaseD].GetInt64());
+  return LowBitsAsUnsigned(property_[Keys::TimebaseD].GetInt64());
 }
 bool FormatCodecVideo::ExistsFrameRateDen() const { return property_.ChildExists(Keys::TimebaseD); }
 void FormatCodecVideo::SetFrameRateDen(unsigned int denominator) {
@@ -143,9 +144,10 @@ void FormatCodecVideo::SetFrameRateDen(unsigned int denominator) {
 }
 
 double FormatCodecVideo::GetFrameRate() const {
-  const unsigned int denominator = GetFrameRateDen();
-  if (denominator == 0) return 0.0;
-  return static_cast<double>(GetFrameRateNum()) / static_cast<double>(denominator);
+  // Through the virtual accessors, so that a subclass sees every read: the denominator is read
+  // for the zero test and again for the division.
+  if (GetFrameRateDen() == 0) return 0.0;
+  return static_cast<double>(GetFrameRateNum()) / static_cast<double>(GetFrameRateDen());
 }
 
 AVPixelFormat FormatCodecVideo::GetPixelFormat() const {

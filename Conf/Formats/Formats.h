@@ -15,6 +15,7 @@
 #include <Tarvek/Core/Errors/Exception.h>
 #include <Tarvek/Core/Errors/PropertyException.h>
 #include <Tarvek/Core/Interfaces/CallStack.h>
+#include <Tarvek/Core/Interfaces/EscapedText.h>
 #include <Tarvek/Core/Interfaces/IBlob.h>
 #include <Tarvek/Core/Interfaces/IRefCountable.h>
 #include <Tarvek/Core/Interfaces/Property.h>

@@ -1,42 +1,17 @@
-// The core property library: the human-readable tree printer.
+// The core property library: the human-readable tree printer and its escaping of texts.
 #include <ostream>
 
+#include <Tarvek/Core/Interfaces/EscapedText.h>
 #include <Tarvek/Core/Interfaces/Property.h>
 
 namespace Tarvek {
 namespace Core {
 namespace {
 
-// Writes `text` so that each node stays on one line and its extent is unambiguous: quotes,
-// backslashes and control bytes are escaped; other bytes (UTF-8 included) pass unchanged.
 void WriteEscaped(std::ostream& out, const std::string& text) {
-  static const char kHex[] = "0123456789abcdef";
-  for (const char c : text) {
-    const auto byte = static_cast<unsigned char>(c);
-    switch (c) {
-      case '"':
-        out << "\\\"";
-        break;
-      case '\\':
-        out << "\\\\";
-        break;
-      case '\n':
-        out << "\\n";
-        break;
-      case '\r':
-        out << "\\r";
-        break;
-      case '\t':
-        out << "\\t";
-        break;
-      default:
-        if (byte < 0x20 || byte == 0x7f) {
-          out << "\\x" << kHex[byte >> 4] << kHex[byte & 0xf];
-        } else {
-          out << c;
-        }
-    }
-  }
+  std::string escaped;
+  AppendEscaped(escaped, text);
+  out << escaped;
 }
 
 void PrintNode(const Property& node, int depth, std::ostream& out, bool showTypes, bool recursive) {
@@ -71,6 +46,38 @@ void PrintNode(const Property& node, int depth, std::ostream& out, bool showType
 }
 
 }  // namespace
+
+void AppendEscaped(std::string& out, const std::string& text) {
+  static const char kHex[] = "0123456789abcdef";
+  for (const char c : text) {
+    const auto byte = static_cast<unsigned char>(c);
+    switch (c) {
+      case '"':
+        out += "\\\"";
+        break;
+      case '\\':
+        out += "\\\\";
+        break;
+      case '\n':
+        out += "\\n";
+        break;
+      case '\r':
+        out += "\\r";
+        break;
+      case '\t':
+        out += "\\t";
+        break;
+      default:
+        if (byte < 0x20 || byte == 0x7f) {
+          out += "\\x";
+          out += kHex[byte >> 4];
+          out += kHex[byte & 0xf];
+        } else {
+          out += c;
+        }
+    }
+  }
+}
 
 void PrintPropertyValue(const Property& property, int indent, std::ostream& out, bool showTypes,
                         bool recursive) {

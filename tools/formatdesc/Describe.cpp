@@ -86,7 +86,8 @@ std::string ReadFile(const std::string& option, const std::string& path) {
 
 // The --from-json description as the subcommand's kind, or a new one of that kind.
 template <class Kind, class Factory>
-boost::intrusive_ptr<Kind> Start(const CodecArgs& args, const std::string& kind, Factory create) {
+boost::intrusive_ptr<Kind> Start(const CodecArgs& args, Tarvek::Conf::FormatKind kind,
+                                 Factory create) {
   if (!args.fromJson) return create();
   return boost::dynamic_pointer_cast<Kind>(
       RequireKind(LoadDescription("--from-json", *args.fromJson), kind, *args.fromJson));
@@ -106,25 +107,20 @@ boost::intrusive_ptr<IFormatCodec> LoadDescription(const std::string& option,
 }
 
 const boost::intrusive_ptr<IFormatCodec>& RequireKind(
-    const boost::intrusive_ptr<IFormatCodec>& description, const std::string& kind,
+    const boost::intrusive_ptr<IFormatCodec>& description, Tarvek::Conf::FormatKind kind,
     const std::string& path) {
-  const std::string found = Tarvek::Conf::DescriptionKind(description);
+  const std::optional<Tarvek::Conf::FormatKind> found = Tarvek::Conf::KindOf(description.get());
   if (found != kind) {
-    throw UsageError("--from-json: '" + path + "' holds " + KindPhrase(found) + ", not " +
-                     KindPhrase(kind));
+    throw UsageError("--from-json: '" + path + "' holds " +
+                     Tarvek::Conf::KindPhrase(found.value_or(Tarvek::Conf::FormatKind::Codec)) +
+                     ", not " + Tarvek::Conf::KindPhrase(kind));
   }
   return description;
 }
 
-std::string KindPhrase(const std::string& kind) {
-  if (kind == "audio") return "an audio description";
-  if (kind == "codec") return "a generic codec description";
-  return "a " + kind + " description";
-}
-
 boost::intrusive_ptr<IFormatCodecVideo> BuildVideo(const VideoArgs& args) {
-  auto video =
-      Start<IFormatCodecVideo>(args.codec, "video", &Tarvek::Conf::FormatCodecVideo::Create);
+  auto video = Start<IFormatCodecVideo>(args.codec, Tarvek::Conf::FormatKind::Video,
+                                        &Tarvek::Conf::FormatCodecVideo::Create);
   if (args.codec.codecId) {
     video->SetCodecID(CheckCodecId("--codec-id", *args.codec.codecId,
                                    Tarvek::Conf::GetPresetVideoCodecs(), "video"));
@@ -140,8 +136,8 @@ boost::intrusive_ptr<IFormatCodecVideo> BuildVideo(const VideoArgs& args) {
 }
 
 boost::intrusive_ptr<IFormatCodecAudio> BuildAudio(const AudioArgs& args) {
-  auto audio =
-      Start<IFormatCodecAudio>(args.codec, "audio", &Tarvek::Conf::FormatCodecAudio::Create);
+  auto audio = Start<IFormatCodecAudio>(args.codec, Tarvek::Conf::FormatKind::Audio,
+                                        &Tarvek::Conf::FormatCodecAudio::Create);
   if (args.codec.codecId) {
     audio->SetCodecID(CheckCodecId("--codec-id", *args.codec.codecId,
                                    Tarvek::Conf::GetPresetAudioCodecs(), "audio"));
@@ -163,7 +159,7 @@ boost::intrusive_ptr<IFormatCodecAudio> BuildAudio(const AudioArgs& args) {
 }
 
 boost::intrusive_ptr<IFormatCodecSubtitle> BuildSubtitle(const SubtitleArgs& args) {
-  auto subtitle = Start<IFormatCodecSubtitle>(args.codec, "subtitle",
+  auto subtitle = Start<IFormatCodecSubtitle>(args.codec, Tarvek::Conf::FormatKind::Subtitle,
                                               &Tarvek::Conf::FormatCodecSubtitle::Create);
   // The presets know no subtitle codecs, so any identifier is taken.
   if (args.codec.codecId) subtitle->SetCodecID(*args.codec.codecId);
@@ -192,22 +188,13 @@ Bitrates AudioBitrates(const boost::intrusive_ptr<const IFormatCodec>& audio) {
 }
 
 std::string OptionForSetting(const std::string& key) {
-  static const std::map<std::string, std::string> options = {
-      {IFormatCodec::TAG_CODEC_ID, "--codec-id"},
-      {IFormatCodec::TAG_BITRATE_MODE, "--bitrate-mode"},
-      {IFormatCodec::TAG_QUALITY, "--quality"},
-      {IFormatCodecVideo::TAG_WIDTH, "--size"},
-      {IFormatCodecVideo::TAG_HEIGHT, "--size"},
-      {IFormatCodecVideo::TAG_ASPECTX, "--size"},
-      {IFormatCodecVideo::TAG_ASPECTY, "--size"},
-      {IFormatCodecVideo::TAG_TIMEBASE_N, "--frame-rate"},
-      {IFormatCodecVideo::TAG_TIMEBASE_D, "--frame-rate"},
-      {IFormatCodecAudio::TAG_SAMPLE_RATE, "--sample-rate"},
-      {IFormatCodecAudio::TAG_LAYOUT, "--layout"},
-      {IFormatCodecAudio::TAG_SAMPLE_FORMAT, "--sample-fmt"},
-  };
-  const auto found = options.find(key);
-  return found == options.end() ? std::string() : found->second;
+  for (const auto kind : {Tarvek::Conf::FormatKind::Video, Tarvek::Conf::FormatKind::Audio,
+                          Tarvek::Conf::FormatKind::Subtitle}) {
+    for (const Tarvek::Conf::Setting& setting : Tarvek::Conf::SettingsOf(kind)) {
+      if (setting.key == key) return setting.option;
+    }
+  }
+  return std::string();
 }
 
 std::vector<LadderRow> BuildLadder(const std::string& codecId, Pair frameRate,

@@ -6,6 +6,7 @@
 #include <Tarvek/Formats.h>
 #include <Tarvek/Inspect/Diff.h>
 #include <Tarvek/Inspect/JsonForm.h>
+#include <Tarvek/Inspect/Settings.h>
 #include <Tarvek/Inspect/Validate.h>
 #include <Tarvek/Presets/BitratePresets.h>
 
@@ -87,14 +88,11 @@ class LoadError : public std::runtime_error {
 boost::intrusive_ptr<Tarvek::Conf::IFormatCodec> LoadDescription(const std::string& option,
                                                                  const std::string& path);
 
-/// `description` when it is of `kind` ("video", "audio", "subtitle"); otherwise a UsageError
+/// `description` when it is of `kind`; otherwise a UsageError
 /// saying that the --from-json file at `path` holds another kind.
 const boost::intrusive_ptr<Tarvek::Conf::IFormatCodec>& RequireKind(
-    const boost::intrusive_ptr<Tarvek::Conf::IFormatCodec>& description, const std::string& kind,
-    const std::string& path);
-
-/// "a video description", "an audio description", "a generic codec description".
-std::string KindPhrase(const std::string& kind);
+    const boost::intrusive_ptr<Tarvek::Conf::IFormatCodec>& description,
+    Tarvek::Conf::FormatKind kind, const std::string& path);
 
 /// Default, minimum and maximum bitrate in bits per second.
 struct Bitrates {

@@ -7,6 +7,8 @@
 #include <iomanip>
 #include <iostream>
 
+#include <Tarvek/Inspect/JsonLayout.h>
+
 extern "C" {
 #include <libavutil/pixdesc.h>
 #include <libavutil/samplefmt.h>
@@ -130,50 +132,6 @@ nlohmann::ordered_json TreeJson(const Tarvek::Core::Property& node) {
 
 nlohmann::ordered_json BitratesJson(const Bitrates& bitrates) {
   return {{"default", bitrates.typical}, {"min", bitrates.minimum}, {"max", bitrates.maximum}};
-}
-
-std::string Dump(const nlohmann::ordered_json& value) {
-  return value.dump(-1, ' ', false, nlohmann::ordered_json::error_handler_t::replace);
-}
-
-// `value` on one line, with ", " and ": " between items.
-std::string OneLine(const nlohmann::ordered_json& value) {
-  if (!value.is_structured() || value.empty()) return Dump(value);
-  std::string line(1, value.is_object() ? '{' : '[');
-  bool first = true;
-  for (const auto& item : value.items()) {
-    if (!first) line += ", ";
-    first = false;
-    if (value.is_object()) line += Dump(item.key()) + ": ";
-    line += OneLine(item.value());
-  }
-  return line + (value.is_object() ? '}' : ']');
-}
-
-// The layout of the library's JSON form, so that the tool's output reads like a stored file:
-// indented by two, objects and arrays of plain values on one line when it stays within 100
-// columns.
-void WriteJson(const nlohmann::ordered_json& value, std::size_t indent, std::size_t column,
-               std::string& out) {
-  const bool plain = std::none_of(value.begin(), value.end(), [](const auto& element) {
-    return element.is_structured() && !element.empty();
-  });
-  const std::string line = plain ? OneLine(value) : std::string();
-  if (!value.is_structured() || value.empty() || (plain && column + line.size() <= 100)) {
-    out += line;
-    return;
-  }
-  const std::string pad(indent + 2, ' ');
-  out += value.is_object() ? "{\n" : "[\n";
-  bool first = true;
-  for (const auto& item : value.items()) {
-    out += first ? pad : ",\n" + pad;
-    first = false;
-    const std::string key = value.is_object() ? Dump(item.key()) + ": " : std::string();
-    out += key;
-    WriteJson(item.value(), indent + 2, pad.size() + key.size(), out);
-  }
-  out += "\n" + std::string(indent, ' ') + (value.is_object() ? '}' : ']');
 }
 
 // Table cells joined by two spaces, each padded to its column's width: left-aligned columns
@@ -386,7 +344,7 @@ nlohmann::ordered_json FindingsJson(const std::vector<Tarvek::Conf::Finding>& fi
 
 void PrintJson(std::ostream& out, const nlohmann::ordered_json& value) {
   std::string text;
-  WriteJson(value, 0, 0, text);
+  Tarvek::Conf::JsonLayout::Write(value, text);
   out << text << '\n';
 }
 

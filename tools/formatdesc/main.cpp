@@ -293,7 +293,7 @@ void LadderFromJson(const std::string& path, std::optional<std::string>& codecId
                     std::optional<Pair>& rate, std::optional<long long>& quality) {
   const auto loaded = LoadDescription("--from-json", path);
   const auto video = boost::dynamic_pointer_cast<Tarvek::Conf::IFormatCodecVideo>(
-      RequireKind(loaded, "video", path));
+      RequireKind(loaded, Tarvek::Conf::FormatKind::Video, path));
   if (video->ExistsCodecID()) codecId = video->GetCodecID();
   if (video->ExistsFrameRateNum() && video->ExistsFrameRateDen() && video->GetFrameRateNum() != 0 &&
       video->GetFrameRateDen() != 0) {
