@@ -14,9 +14,9 @@ namespace {
 // The low 32 bits of a stored value, as the unsigned accessors return them.
 unsigned int LowBitsAsUnsigned(long long value) { return static_cast<unsigned int>(value); }
 
-// Reduces (a x b) : (c x d) to lowest terms. The products are exact in 64 bits, so a large
-// size times a large aspect term no longer wraps; a reduced term beyond 32 bits keeps its low
-// 32 bits, the most the interface can return.
+// Reduces (a x b) : (c x d) to lowest terms. The products are exact in 64 bits, so a large size
+// times a large aspect term cannot wrap; a reduced term beyond 32 bits keeps its low 32 bits, the
+// most the interface can return.
 void ReduceProducts(unsigned int a, unsigned int b, unsigned int c, unsigned int d, unsigned int& x,
                     unsigned int& y) {
   std::uint64_t px = std::uint64_t{a} * b;

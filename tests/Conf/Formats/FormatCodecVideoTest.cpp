@@ -51,8 +51,8 @@ TEST_F(FormatCodecVideoTest, FrameAspectDividesInDoublePrecision) {
   EXPECT_TRUE(std::isnan(video_->GetFrameAspect()));
 }
 
-// Products above 32 bits used to wrap before reduction; they are now reduced exactly, and a
-// reduced term beyond 32 bits keeps its low 32 bits.
+// Products above 32 bits are reduced exactly, and a reduced term beyond 32 bits keeps its low
+// 32 bits.
 TEST_F(FormatCodecVideoTest, FrameAspectOfLargeProductsIsExact) {
   struct Case {
     unsigned int width, height, pixelX, pixelY, frameX, frameY;
