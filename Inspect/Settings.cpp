@@ -91,8 +91,6 @@ const char* KindPhrase(FormatKind kind) noexcept {
 }
 
 const std::vector<Setting>& SettingsOf(FormatKind kind) {
-  // Pixel and sample formats are enumerations of libavutil: Int64 here, checked against the
-  // enumeration by validation.
   static const std::vector<Setting> codec = CodecSettings();
   static const std::vector<Setting> video = With({
       {"", Video::TAG_WIDTH, PropertyTypeInt64, ValueRange::Unsigned32, "--size"},
@@ -101,7 +99,7 @@ const std::vector<Setting>& SettingsOf(FormatKind kind) {
       {"", Video::TAG_ASPECTY, PropertyTypeInt64, ValueRange::Unsigned32, "--size"},
       {"", Video::TAG_TIMEBASE_N, PropertyTypeInt64, ValueRange::Unsigned32, "--frame-rate"},
       {"", Video::TAG_TIMEBASE_D, PropertyTypeInt64, ValueRange::Unsigned32, "--frame-rate"},
-      {"", Video::TAG_PIX_FMT, PropertyTypeInt64, ValueRange::Int64, "--pix-fmt"},
+      {"", Video::TAG_PIX_FMT, PropertyTypeInt64, ValueRange::Signed32, "--pix-fmt"},
   });
   static const std::vector<Setting> audio = With({
       {IFormat::TAG_METADATA, Codec::TAG_LANGUAGE, PropertyTypeString, ValueRange::Int64,
@@ -109,7 +107,7 @@ const std::vector<Setting>& SettingsOf(FormatKind kind) {
       {"", Audio::TAG_SAMPLE_RATE, PropertyTypeInt64, ValueRange::Signed32, "--sample-rate"},
       {"", Audio::TAG_LAYOUT, PropertyTypeInt64, ValueRange::Unsigned32, "--layout"},
       {"", Audio::TAG_FRAME_SIZE, PropertyTypeInt64, ValueRange::Signed32, "--frame-size"},
-      {"", Audio::TAG_SAMPLE_FORMAT, PropertyTypeInt64, ValueRange::Int64, "--sample-fmt"},
+      {"", Audio::TAG_SAMPLE_FORMAT, PropertyTypeInt64, ValueRange::Signed32, "--sample-fmt"},
   });
   static const std::vector<Setting> subtitle = With({
       {"", Codec::TAG_LANGUAGE, PropertyTypeString, ValueRange::Int64, "--language"},

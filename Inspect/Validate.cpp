@@ -138,6 +138,11 @@ void CheckEnumeration(Review& review, const std::string& key, long long count,
   const Core::Property* node = review.Integer(key);
   if (node == nullptr) return;
   const long long value = node->GetInt64();
+  // A value beyond 32 bits is reported with the ranges.
+  if (value < std::numeric_limits<std::int32_t>::min() ||
+      value > std::numeric_limits<std::int32_t>::max()) {
+    return;
+  }
   if (value < 0 || value >= count) {
     review.Add(Severity::Error, key,
                key + " " + std::to_string(value) + " is not " + what + " libavutil knows");

@@ -28,6 +28,7 @@
 #include <vector>
 
 #include <Tarvek/Formats.h>
+#include <Tarvek/Inspect/Settings.h>
 #include <Tarvek/Presets/BitratePresets.h>
 #include <boost/exception/get_error_info.hpp>
 
@@ -275,14 +276,26 @@ I& As(Codec& codec) {
 // ---- The settings, as tables: key, kind, storage and the three accessors ----
 
 // How an integer setting is stored and read: 64 bits as they are, or 32 bits sign- or
-// zero-extended (the getter returns the low 32 bits).
-enum class Storage { k64, kSigned32, kUnsigned32 };
+// zero-extended (the getter returns the low 32 bits), as the inspection library's table of
+// settings says; the getters are checked against it.
+using Storage = Conf::ValueRange;
+
+Storage StorageOf(Kind kind, const std::string& key) {
+  const Conf::FormatKind of = kind == kVideo      ? Conf::FormatKind::Video
+                              : kind == kAudio    ? Conf::FormatKind::Audio
+                              : kind == kSubtitle ? Conf::FormatKind::Subtitle
+                                                  : Conf::FormatKind::Codec;
+  for (const Conf::Setting& setting : Conf::SettingsOf(of)) {
+    if (setting.key == key) return setting.range;
+  }
+  return Storage::Int64;
+}
 
 long long Narrow(Storage storage, long long value) {
   switch (storage) {
-    case Storage::kSigned32:
+    case Storage::Signed32:
       return static_cast<std::int32_t>(value);
-    case Storage::kUnsigned32:
+    case Storage::Unsigned32:
       return static_cast<long long>(static_cast<std::uint32_t>(value));
     default:
       return value;
@@ -315,11 +328,12 @@ struct FlagSetting {
 };
 
 // One line a setting in the tables below, instead of three lambdas each.
-#define TARVEK_INTEGER(Class, kind, Key, Name, Type, storage)                               \
-  IntegerSetting {                                                                          \
-    &Class::Key, kind, storage, [](const Codec& c) { return As<Class>(c).Exists##Name(); }, \
-        [](const Codec& c) { return static_cast<long long>(As<Class>(c).Get##Name()); },    \
-        [](Codec& c, long long v) { As<Class>(c).Set##Name(static_cast<Type>(v)); }         \
+#define TARVEK_INTEGER(Class, kind, Key, Name, Type)                                     \
+  IntegerSetting {                                                                       \
+    &Class::Key, kind, StorageOf(kind, Class::Key),                                      \
+        [](const Codec& c) { return As<Class>(c).Exists##Name(); },                      \
+        [](const Codec& c) { return static_cast<long long>(As<Class>(c).Get##Name()); }, \
+        [](Codec& c, long long v) { As<Class>(c).Set##Name(static_cast<Type>(v)); }      \
   }
 
 #define TARVEK_TEXT(Class, kind, key, inMetadata, Name)                                \
@@ -341,27 +355,23 @@ const std::vector<IntegerSetting>& IntegerSettings() {
   using Audio = Conf::IFormatCodecAudio;
   using Subtitle = Conf::IFormatCodecSubtitle;
   static const std::vector<IntegerSetting> settings = {
-      TARVEK_INTEGER(Codec, kAnyKind, TAG_FOURCC, CodecTag, long long, Storage::k64),
-      TARVEK_INTEGER(Codec, kAnyKind, TAG_BITRATE, Bitrate, long long, Storage::k64),
-      TARVEK_INTEGER(Codec, kAnyKind, TAG_QUALITY, Quality, long long, Storage::k64),
-      TARVEK_INTEGER(Codec, kAnyKind, TAG_THREAD_NUMBER, ThreadNumber, unsigned,
-                     Storage::kUnsigned32),
-      TARVEK_INTEGER(Video, kVideo, TAG_WIDTH, Width, unsigned, Storage::kUnsigned32),
-      TARVEK_INTEGER(Video, kVideo, TAG_HEIGHT, Height, unsigned, Storage::kUnsigned32),
-      TARVEK_INTEGER(Video, kVideo, TAG_ASPECTX, PixelAspectX, unsigned, Storage::kUnsigned32),
-      TARVEK_INTEGER(Video, kVideo, TAG_ASPECTY, PixelAspectY, unsigned, Storage::kUnsigned32),
-      TARVEK_INTEGER(Video, kVideo, TAG_TIMEBASE_N, FrameRateNum, unsigned, Storage::kUnsigned32),
-      TARVEK_INTEGER(Video, kVideo, TAG_TIMEBASE_D, FrameRateDen, unsigned, Storage::kUnsigned32),
-      TARVEK_INTEGER(Video, kVideo, TAG_PIX_FMT, PixelFormat, AVPixelFormat, Storage::kSigned32),
-      TARVEK_INTEGER(Audio, kAudio, TAG_SAMPLE_RATE, SampleRate, int, Storage::kSigned32),
-      TARVEK_INTEGER(Audio, kAudio, TAG_LAYOUT, ChannelLayout, Conf::ChannelLayout,
-                     Storage::kUnsigned32),
-      TARVEK_INTEGER(Audio, kAudio, TAG_FRAME_SIZE, FrameSize, int, Storage::kSigned32),
-      TARVEK_INTEGER(Audio, kAudio, TAG_SAMPLE_FORMAT, SampleFormat, AVSampleFormat,
-                     Storage::kSigned32),
-      TARVEK_INTEGER(Subtitle, kSubtitle, TAG_DVB_WIDTH, DVBWidth, unsigned, Storage::kUnsigned32),
-      TARVEK_INTEGER(Subtitle, kSubtitle, TAG_DVB_HEIGHT, DVBHeight, unsigned,
-                     Storage::kUnsigned32),
+      TARVEK_INTEGER(Codec, kAnyKind, TAG_FOURCC, CodecTag, long long),
+      TARVEK_INTEGER(Codec, kAnyKind, TAG_BITRATE, Bitrate, long long),
+      TARVEK_INTEGER(Codec, kAnyKind, TAG_QUALITY, Quality, long long),
+      TARVEK_INTEGER(Codec, kAnyKind, TAG_THREAD_NUMBER, ThreadNumber, unsigned),
+      TARVEK_INTEGER(Video, kVideo, TAG_WIDTH, Width, unsigned),
+      TARVEK_INTEGER(Video, kVideo, TAG_HEIGHT, Height, unsigned),
+      TARVEK_INTEGER(Video, kVideo, TAG_ASPECTX, PixelAspectX, unsigned),
+      TARVEK_INTEGER(Video, kVideo, TAG_ASPECTY, PixelAspectY, unsigned),
+      TARVEK_INTEGER(Video, kVideo, TAG_TIMEBASE_N, FrameRateNum, unsigned),
+      TARVEK_INTEGER(Video, kVideo, TAG_TIMEBASE_D, FrameRateDen, unsigned),
+      TARVEK_INTEGER(Video, kVideo, TAG_PIX_FMT, PixelFormat, AVPixelFormat),
+      TARVEK_INTEGER(Audio, kAudio, TAG_SAMPLE_RATE, SampleRate, int),
+      TARVEK_INTEGER(Audio, kAudio, TAG_LAYOUT, ChannelLayout, Conf::ChannelLayout),
+      TARVEK_INTEGER(Audio, kAudio, TAG_FRAME_SIZE, FrameSize, int),
+      TARVEK_INTEGER(Audio, kAudio, TAG_SAMPLE_FORMAT, SampleFormat, AVSampleFormat),
+      TARVEK_INTEGER(Subtitle, kSubtitle, TAG_DVB_WIDTH, DVBWidth, unsigned),
+      TARVEK_INTEGER(Subtitle, kSubtitle, TAG_DVB_HEIGHT, DVBHeight, unsigned),
   };
   return settings;
 }
@@ -927,14 +937,14 @@ void OpIsCompatible(State& state, Program& program) {
   using A = Conf::IFormatCodecAudio;
   std::vector<std::pair<const std::string*, Storage>> pairs;
   if (kind == kVideo) {
-    pairs = {{&V::TAG_WIDTH, Storage::kUnsigned32},
-             {&V::TAG_HEIGHT, Storage::kUnsigned32},
-             {&V::TAG_ASPECTX, Storage::kUnsigned32},
-             {&V::TAG_ASPECTY, Storage::kUnsigned32}};
+    for (const std::string* key :
+         {&V::TAG_WIDTH, &V::TAG_HEIGHT, &V::TAG_ASPECTX, &V::TAG_ASPECTY}) {
+      pairs.emplace_back(key, StorageOf(kind, *key));
+    }
   } else if (kind == kAudio) {
-    pairs = {{&A::TAG_SAMPLE_RATE, Storage::kSigned32},
-             {&A::TAG_LAYOUT, Storage::kUnsigned32},
-             {&A::TAG_SAMPLE_FORMAT, Storage::kSigned32}};
+    for (const std::string* key : {&A::TAG_SAMPLE_RATE, &A::TAG_LAYOUT, &A::TAG_SAMPLE_FORMAT}) {
+      pairs.emplace_back(key, StorageOf(kind, *key));
+    }
   }
   Outcome outcome = Outcome::kValue;
   bool expected = true;
