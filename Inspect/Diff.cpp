@@ -88,7 +88,8 @@ void DiffChildren(const Core::Property& a, const Core::Property& b, const std::s
     const std::string childPath = Join(path, Segment(child.GetName(), occurrence));
     const auto found = inB.find(Key(child.GetName(), occurrence));
     if (found == inB.end()) {
-      entries.push_back({childPath, DifferenceKind::OnlyInA, ValueText(child), ""});
+      entries.push_back(
+          {childPath, DifferenceKind::OnlyInA, ValueText(child), "", &child, nullptr});
       continue;
     }
     if (anyMatch && found->second < lastMatch) inOrder = false;
@@ -100,7 +101,8 @@ void DiffChildren(const Core::Property& a, const Core::Property& b, const std::s
   for (std::size_t i = 0; i < childrenB.size(); ++i) {
     if (matched[i]) continue;
     entries.push_back({Join(path, Segment(childrenB[i]->GetName(), occurrencesB[i])),
-                       DifferenceKind::OnlyInB, "", ValueText(*childrenB[i])});
+                       DifferenceKind::OnlyInB, "", ValueText(*childrenB[i]), nullptr,
+                       childrenB[i]});
   }
   if (!inOrder) out.push_back({path, DifferenceKind::OtherOrder, NamesText(a), NamesText(b)});
   out.insert(out.end(), entries.begin(), entries.end());
@@ -109,11 +111,11 @@ void DiffChildren(const Core::Property& a, const Core::Property& b, const std::s
 void DiffNodes(const Core::Property& a, const Core::Property& b, const std::string& path,
                std::vector<Difference>& out) {
   if (a.GetType() != b.GetType()) {
-    out.push_back({path, DifferenceKind::OtherType, ValueText(a), ValueText(b)});
+    out.push_back({path, DifferenceKind::OtherType, ValueText(a), ValueText(b), &a, &b});
   } else if (a.GetType() == PropertyTypeContainer) {
     DiffChildren(a, b, path, out);
   } else if (!SameLeaf(a, b)) {
-    out.push_back({path, DifferenceKind::OtherValue, ValueText(a), ValueText(b)});
+    out.push_back({path, DifferenceKind::OtherValue, ValueText(a), ValueText(b), &a, &b});
   }
 }
 
@@ -262,9 +264,11 @@ std::vector<Difference> Diff(const boost::intrusive_ptr<const IFormat>& a,
   std::vector<Difference> out;
   if (!a && !b) return out;
   if (!a) {
-    out.push_back({"", DifferenceKind::OnlyInB, "", ValueText(b->GetProperty())});
+    out.push_back(
+        {"", DifferenceKind::OnlyInB, "", ValueText(b->GetProperty()), nullptr, &b->GetProperty()});
   } else if (!b) {
-    out.push_back({"", DifferenceKind::OnlyInA, ValueText(a->GetProperty()), ""});
+    out.push_back(
+        {"", DifferenceKind::OnlyInA, ValueText(a->GetProperty()), "", &a->GetProperty(), nullptr});
   } else {
     const Core::Property& treeA = a->GetProperty();
     const Core::Property& treeB = b->GetProperty();

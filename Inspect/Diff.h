@@ -46,6 +46,11 @@ struct Difference {
   /// the two root names, quoted.
   std::string a;
   std::string b;
+  /// The nodes themselves, inside the trees of a and b, for a setting only in a, only in b, of
+  /// another type or value; null on the side that lacks it and for the other kinds. They stay
+  /// valid while both descriptions live and their trees are not changed.
+  const Core::Property* nodeA = nullptr;
+  const Core::Property* nodeB = nullptr;
 };
 
 /// Every difference between the property trees of `a` and `b`, in the order of a's tree, with

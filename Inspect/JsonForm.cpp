@@ -5,6 +5,7 @@
 #include <cstdint>
 #include <limits>
 #include <nlohmann/json.hpp>
+#include <unordered_set>
 #include <utility>
 #include <vector>
 
@@ -421,10 +422,80 @@ void CheckNesting(const std::string& text) {
   }
 }
 
+// A member's name as a JSON pointer component (RFC 6901).
+std::string PointerComponent(const std::string& name) {
+  std::string out;
+  for (const char c : name) {
+    if (c == '~') {
+      out += "~0";
+    } else if (c == '/') {
+      out += "~1";
+    } else {
+      out += c;
+    }
+  }
+  return out;
+}
+
+// Follows the parse to refuse an object that names a member twice (JSON takes the last one
+// silently, so an edit of the first would be lost), naming the member's JSON pointer.
+class DuplicateMembers {
+ public:
+  bool operator()(int /*depth*/, Json::parse_event_t event, Json& parsed) {
+    switch (event) {
+      case Json::parse_event_t::object_start:
+      case Json::parse_event_t::array_start:
+        frames_.push_back({event == Json::parse_event_t::object_start, Component(), {}, {}, 0});
+        break;
+      case Json::parse_event_t::key: {
+        Frame& frame = frames_.back();
+        frame.key = parsed.get_ref<const std::string&>();
+        if (!frame.keys.insert(frame.key).second) {
+          Fail(Pointer() + "/" + PointerComponent(frame.key),
+               "the member " + Quote(frame.key) + " appears twice in one object");
+        }
+        break;
+      }
+      case Json::parse_event_t::value:
+        if (!frames_.empty() && !frames_.back().object) ++frames_.back().next;
+        break;
+      case Json::parse_event_t::object_end:
+      case Json::parse_event_t::array_end:
+        frames_.pop_back();
+        break;
+    }
+    return true;
+  }
+
+ private:
+  struct Frame {
+    bool object;
+    std::string component;  // how the parent reaches it
+    std::unordered_set<std::string> keys;
+    std::string key;   // the member being read, in an object
+    std::size_t next;  // the index of the next element, in an array
+  };
+
+  // The component of a value that starts now, inside the innermost container.
+  std::string Component() {
+    if (frames_.empty()) return std::string();
+    Frame& parent = frames_.back();
+    return parent.object ? PointerComponent(parent.key) : std::to_string(parent.next++);
+  }
+
+  std::string Pointer() const {
+    std::string pointer;
+    for (std::size_t i = 1; i < frames_.size(); ++i) pointer += "/" + frames_[i].component;
+    return pointer;
+  }
+
+  std::vector<Frame> frames_;
+};
+
 Json Parse(const std::string& text) {
   CheckNesting(text);
   try {
-    return Json::parse(text);
+    return Json::parse(text, DuplicateMembers());
   } catch (const Json::exception& e) {
     // "[json.exception.parse_error.101] parse error at line 1, column 7: ..." without its tag.
     const std::string what = e.what();

@@ -42,6 +42,16 @@ class Review {
     return found == container->GetChildren().end() ? nullptr : &*found;
   }
 
+  // How many children named `key` the container `parent` ("" for the root) has.
+  std::size_t Count(const std::string& parent, const std::string& key) const {
+    const Core::Property* container = parent.empty() ? &tree_ : Find("", parent);
+    if (container == nullptr || container->GetType() != PropertyTypeContainer) return 0;
+    const auto& children = container->GetChildren();
+    return static_cast<std::size_t>(
+        std::count_if(children.begin(), children.end(),
+                      [&](const Core::Property& child) { return child.GetName() == key; }));
+  }
+
   // The root child `key` when it holds an int64, else null.
   const Core::Property* Integer(const std::string& key) const {
     const Core::Property* node = Find("", key);
@@ -71,6 +81,11 @@ void CheckTypesAndRanges(Review& review, const std::vector<Setting>& keys) {
     const Core::Property* node = review.Find(known.parent, known.key);
     if (node == nullptr) continue;
     const std::string path = PathOf(known);
+    if (review.Count(known.parent, known.key) > 1) {
+      review.Add(Severity::Error, path,
+                 path + " is present " + std::to_string(review.Count(known.parent, known.key)) +
+                     " times; the accessors read the first and the others are lost to them");
+    }
     if (node->GetType() != known.type) {
       review.Add(Severity::Error, path,
                  path + " holds " + ValueText(*node) + ", but its accessors read " +
@@ -152,9 +167,11 @@ void CheckEnumeration(Review& review, const std::string& key, long long count,
 void CheckVideo(Review& review) {
   const std::string bitrates = "the bitrate functions need it";
   CheckPresent(review,
-               {IFormatCodec::TAG_CODEC_ID, IFormatCodec::TAG_BITRATE_MODE, Video::TAG_WIDTH,
-                Video::TAG_HEIGHT, Video::TAG_TIMEBASE_N, Video::TAG_TIMEBASE_D},
+               {IFormatCodec::TAG_CODEC_ID, Video::TAG_WIDTH, Video::TAG_HEIGHT,
+                Video::TAG_TIMEBASE_N, Video::TAG_TIMEBASE_D},
                Severity::Error, bitrates);
+  // A stream read from a file states no bitrate mode: usable, the bitrates wait for one.
+  CheckPresent(review, {IFormatCodec::TAG_BITRATE_MODE}, Severity::Warning, bitrates);
   const Core::Property* mode = review.Find("", IFormatCodec::TAG_BITRATE_MODE);
   if (mode != nullptr && mode->GetType() == PropertyTypeString &&
       mode->GetString() == IFormatCodec::TAG_BITRATE_MODE_VBR) {
@@ -186,7 +203,9 @@ void CheckAudio(Review& review) {
 // its type: what they still refuse, the presets refuse, and say why.
 void CheckBitrate(Review& review, const boost::intrusive_ptr<const IFormatCodec>& codec,
                   bool video) {
-  if (review.HasError()) return;
+  if (review.HasError() || (video && review.Find("", IFormatCodec::TAG_BITRATE_MODE) == nullptr)) {
+    return;
+  }
   long long minimum = 0;
   long long maximum = 0;
   try {

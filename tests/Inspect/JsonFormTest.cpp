@@ -263,6 +263,13 @@ TEST(JsonForm, RejectsEveryKindOfBadTextSayingWhereAndWhat) {
        "/private_data: invalid base64: stray bits before the padding"},
       {"private data type", Edited([](Json& d) { d["private_data"] = 5; }), "/private_data",
        "/private_data: expected a base64 string or null, found the number 5"},
+      {"member twice",
+       [] {
+         std::string text = SmallVideo().dump();
+         const std::string width = "\"name\":\"width\"";
+         return text.replace(text.find(width), width.size(), width + "," + width);
+       },
+       width + "/name", width + "/name: the member \"name\" appears twice in one object"},
       {"absurd nesting", [deep] { return deep; }, "-",
        "JSON nested deeper than 129 levels at line 1, column 130; a description's tree holds at "
        "most 64 levels"},

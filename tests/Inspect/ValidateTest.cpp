@@ -57,6 +57,15 @@ std::function<void(IFormatCodec&)> Removed(const std::string& key) {
   };
 }
 
+// A second child `key` appended to the root, which the accessors never read.
+std::function<void(IFormatCodec&)> Appended(const std::string& key, long long value) {
+  return [key, value](IFormatCodec& codec) {
+    Core::Property tree = codec.GetProperty();
+    tree.CreateChildT<long long>(key, value);
+    codec.SetProperty(tree);
+  };
+}
+
 struct Case {
   const char* what;
   std::function<boost::intrusive_ptr<IFormatCodec>()> clean;
@@ -97,8 +106,10 @@ TEST(Validate, ReportsEachFindingOnItsOwn) {
        Severity::Error, "threads",
        "threads holds -1, beyond the range 0 to 4294967295 its accessor reads (it reads "
        "4294967295)"},
-      {"missing mode", CleanVideo, Removed(IFormatCodec::TAG_BITRATE_MODE), Severity::Error,
+      {"missing mode", CleanVideo, Removed(IFormatCodec::TAG_BITRATE_MODE), Severity::Warning,
        "bitrate_mode", "bitrate_mode" + needed},
+      {"repeated setting", CleanVideo, Appended(Video::TAG_WIDTH, 1280), Severity::Error, "width",
+       "width is present 2 times; the accessors read the first and the others are lost to them"},
       {"missing quality", CleanVideo, Stored<std::string>(IFormatCodec::TAG_BITRATE_MODE, "vbr"),
        Severity::Error, "quality", "quality" + needed + " in vbr mode"},
       {"missing sample format", CleanAudio, Removed(Audio::TAG_SAMPLE_FORMAT), Severity::Error,

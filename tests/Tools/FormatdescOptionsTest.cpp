@@ -77,12 +77,14 @@ TEST(FormatdescOptions, CountsAreDecimalWithinRange) {
   }
 }
 
-TEST(FormatdescOptions, BitrateTakesKiloAndMegaSuffixes) {
+TEST(FormatdescOptions, BitrateTakesKiloMegaAndGigaSuffixes) {
   EXPECT_EQ(ParseBitrate("--bitrate", "4500000"), 4500000);
   EXPECT_EQ(ParseBitrate("--bitrate", "4500k"), 4500000);
+  EXPECT_EQ(ParseBitrate("--bitrate", "4K"), 4000);
   EXPECT_EQ(ParseBitrate("--bitrate", "4.5M"), 4500000);
+  EXPECT_EQ(ParseBitrate("--bitrate", "1.25G"), 1250000000);
   EXPECT_EQ(ParseBitrate("--bitrate", "1.0005k"), 1001);
-  for (const char* bad : {"0", "0k", "-1", "4.5G", "M", "4.5.1M", "1.5e6", "0.0000001M"}) {
+  for (const char* bad : {"0", "0k", "-1", "4.5m", "4.5T", "M", "4.5.1M", "1.5e6", "0.0000001M"}) {
     EXPECT_THROW(ParseBitrate("--bitrate", bad), UsageError) << bad;
   }
 }

@@ -1,6 +1,8 @@
 // formatdesc's descriptions, built only through the library's public interfaces.
 #include "Describe.h"
 
+#include "Output.h"
+
 #include <boost/exception/get_error_info.hpp>
 #include <cerrno>
 #include <cstdio>
@@ -34,7 +36,10 @@ Tarvek::Core::Property OptionsTree(const std::string& option,
 void SetCodecSettings(IFormatCodec& codec, const CodecArgs& args) {
   if (args.codecName) codec.SetCodecName(*args.codecName);
   if (args.tag) codec.SetCodecTag(ParseCodecTag("--tag", *args.tag));
-  if (args.bitrateMode) codec.SetBitrateMode(*args.bitrateMode);
+  if (args.bitrateMode) {
+    codec.SetBitrateMode(ParseChoice("--bitrate-mode", *args.bitrateMode,
+                                     {"cbr", IFormatCodec::TAG_BITRATE_MODE_VBR}));
+  }
   if (args.bitrate) codec.SetBitrate(ParseBitrate("--bitrate", *args.bitrate));
   if (args.quality) codec.SetQuality(ParseNonNegative("--quality", *args.quality, kMaxInt));
   if (args.threads) {
@@ -89,17 +94,99 @@ template <class Kind, class Factory>
 boost::intrusive_ptr<Kind> Start(const CodecArgs& args, Tarvek::Conf::FormatKind kind,
                                  Factory create) {
   if (!args.fromJson) return create();
-  return boost::dynamic_pointer_cast<Kind>(
-      RequireKind(LoadDescription("--from-json", *args.fromJson), kind, *args.fromJson));
+  return boost::dynamic_pointer_cast<Kind>(RequireKind(
+      LoadDescription("--from-json", *args.fromJson, args.stream), kind, *args.fromJson));
+}
+
+}  // namespace
+
+namespace {
+
+using Json = nlohmann::ordered_json;
+
+// The first place where `stored` and `derived` differ, as a JSON pointer below `pointer`, with
+// both values; empty when they agree.
+std::string FirstDifference(const Json& stored, const Json& derived, const std::string& pointer) {
+  if (stored.is_object() && derived.is_object()) {
+    auto a = stored.begin();
+    auto b = derived.begin();
+    for (; a != stored.end() && b != derived.end(); ++a, ++b) {
+      if (a.key() != b.key()) {
+        return pointer + ": holds the member \"" + a.key() + "\" where the tree gives \"" +
+               b.key() + "\"";
+      }
+      const std::string inner = FirstDifference(*a, *b, pointer + "/" + a.key());
+      if (!inner.empty()) return inner;
+    }
+    if (a == stored.end() && b == derived.end()) return std::string();
+    return pointer + (a != stored.end() ? ": has the member \"" + a.key() + "\" the tree lacks"
+                                        : ": lacks the member \"" + b.key() + "\" of the tree");
+  }
+  if (stored == derived) return std::string();
+  return pointer + ": " + stored.dump() + " disagrees with the tree's " + derived.dump();
+}
+
+// The description object a stream specifier picks out of a probe document's streams: an index
+// ("2"), or the n-th stream of a kind ("v:0", "a:1", "s:0").
+const Json& PickStream(const Json& streams, const std::optional<std::string>& spec,
+                       const std::string& path) {
+  std::vector<const Json*> described;
+  for (const Json& stream : streams) {
+    if (stream.is_object() && stream.contains("description")) described.push_back(&stream);
+  }
+  if (!spec) {
+    if (described.size() == 1) return (*described.front())["description"];
+    throw UsageError("'" + path + "' holds " + std::to_string(described.size()) +
+                     " described streams; pick one with --stream (2, v:0, a:1)");
+  }
+  const std::size_t colon = spec->find(':');
+  const std::string kindLetter = colon == std::string::npos ? "" : spec->substr(0, colon);
+  const std::string kind = kindLetter == "v"   ? "video"
+                           : kindLetter == "a" ? "audio"
+                           : kindLetter == "s" ? "subtitle"
+                                               : "";
+  if (colon != std::string::npos && kind.empty()) {
+    throw BadValue("--stream", "a stream index (2) or a kind and an index (v:0, a:1, s:0)", *spec);
+  }
+  const long long wanted = ParseNonNegative(
+      "--stream", colon == std::string::npos ? *spec : spec->substr(colon + 1), 1 << 30);
+  long long seen = 0;
+  for (const Json& stream : streams) {
+    if (!stream.is_object()) continue;
+    const bool match = kind.empty()
+                           ? stream.value("index", -1LL) == wanted
+                           : stream.value("kind", std::string()) == kind && seen++ == wanted;
+    if (!match) continue;
+    if (!stream.contains("description")) {
+      throw UsageError("--stream: stream " + *spec + " of '" + path + "' holds no description");
+    }
+    return stream["description"];
+  }
+  throw UsageError("--stream: '" + path + "' has no stream " + *spec);
 }
 
 }  // namespace
 
 boost::intrusive_ptr<IFormatCodec> LoadDescription(const std::string& option,
-                                                   const std::string& path) {
+                                                   const std::string& path,
+                                                   const std::optional<std::string>& stream) {
   const std::string text = ReadFile(option, path);
   try {
-    return Tarvek::Conf::FromJson(text);
+    Json document = Json::parse(text, nullptr, false);
+    const bool several = document.is_object() && document.contains("streams") &&
+                         document["streams"].is_array() && !document.contains("tree");
+    if (several) document = PickStream(document["streams"], stream, path);
+    const auto description = Tarvek::Conf::FromJson(several ? document.dump() : text);
+    // The settings block is derived from the tree: an edit there must not pass unnoticed.
+    if (document.is_object() && document.contains("settings")) {
+      const std::string differs = FirstDifference(
+          document["settings"], SettingsJson(description->GetProperty()), "/settings");
+      if (!differs.empty()) {
+        throw LoadError(path + ": " + differs +
+                        " (the settings are derived from the tree: edit the tree)");
+      }
+    }
+    return description;
   } catch (const Tarvek::Conf::JsonFormError& e) {
     const std::string* what = boost::get_error_info<Tarvek::DescriptionInfo>(e);
     throw LoadError(path + ": " + (what != nullptr ? *what : std::string("not a description")));
@@ -185,6 +272,26 @@ Bitrates VideoBitrates(const boost::intrusive_ptr<const IFormatCodec>& video) {
 Bitrates AudioBitrates(const boost::intrusive_ptr<const IFormatCodec>& audio) {
   return Bitrates{Tarvek::Conf::GetDefaultAudioBitrate(audio),
                   Tarvek::Conf::GetMinAudioBitrate(audio), Tarvek::Conf::GetMaxAudioBitrate(audio)};
+}
+
+std::vector<std::string> MissingForBitrates(const IFormatCodec& codec) {
+  std::vector<std::string> needed;
+  if (dynamic_cast<const IFormatCodecVideo*>(&codec) != nullptr) {
+    needed = {IFormatCodec::TAG_CODEC_ID,        IFormatCodec::TAG_BITRATE_MODE,
+              IFormatCodecVideo::TAG_WIDTH,      IFormatCodecVideo::TAG_HEIGHT,
+              IFormatCodecVideo::TAG_TIMEBASE_N, IFormatCodecVideo::TAG_TIMEBASE_D};
+    if (codec.ExistsBitrateMode() && codec.GetBitrateMode() == IFormatCodec::TAG_BITRATE_MODE_VBR) {
+      needed.push_back(IFormatCodec::TAG_QUALITY);
+    }
+  } else if (dynamic_cast<const IFormatCodecAudio*>(&codec) != nullptr) {
+    needed = {IFormatCodec::TAG_CODEC_ID, IFormatCodecAudio::TAG_SAMPLE_RATE,
+              IFormatCodecAudio::TAG_LAYOUT, IFormatCodecAudio::TAG_SAMPLE_FORMAT};
+  }
+  std::vector<std::string> missing;
+  for (const std::string& key : needed) {
+    if (!codec.GetProperty().ChildExists(key)) missing.push_back(key);
+  }
+  return missing;
 }
 
 std::string OptionForSetting(const std::string& key) {

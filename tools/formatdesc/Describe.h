@@ -23,6 +23,7 @@ namespace Formatdesc {
 /// Texts are read (and refused with a UsageError) only when the description is built.
 struct CodecArgs {
   std::optional<std::string> fromJson;  // a file holding the description to start from
+  std::optional<std::string> stream;    // which stream of a --from-json file of several
   std::optional<std::string> codecId;
   std::optional<std::string> codecName;
   std::optional<std::string> tag;
@@ -82,11 +83,15 @@ class LoadError : public std::runtime_error {
   using std::runtime_error::runtime_error;
 };
 
-/// The description in the file at `path`, read with the library's FromJson (formatdesc --json
-/// writes such files). Throws UsageError naming `option` (when not empty) for a file that
-/// cannot be read, LoadError for one that holds no description.
-boost::intrusive_ptr<Tarvek::Conf::IFormatCodec> LoadDescription(const std::string& option,
-                                                                 const std::string& path);
+/// The description in the file at `path`, read with the library's FromJson: any document
+/// formatdesc --json writes. Of a document with several streams (probe --json), the one `stream`
+/// picks (an index "2", or "v:0", "a:1", "s:0"), or the only described one when not given. A
+/// "settings" block beside the tree must agree with it. Throws UsageError naming `option` (when
+/// not empty) for a file that cannot be read or a stream that cannot be picked, LoadError for a
+/// file that holds no description or settings that disagree with its tree.
+boost::intrusive_ptr<Tarvek::Conf::IFormatCodec> LoadDescription(
+    const std::string& option, const std::string& path,
+    const std::optional<std::string>& stream = std::nullopt);
 
 /// `description` when it is of `kind`; otherwise a UsageError
 /// saying that the --from-json file at `path` holds another kind.
@@ -105,6 +110,11 @@ struct Bitrates {
 /// a missing setting, Core::ChildNotFound naming it (see OptionForSetting).
 Bitrates VideoBitrates(const boost::intrusive_ptr<const Tarvek::Conf::IFormatCodec>& video);
 Bitrates AudioBitrates(const boost::intrusive_ptr<const Tarvek::Conf::IFormatCodec>& audio);
+
+/// The settings the bitrate functions need that `codec` lacks, in the order they are listed
+/// in its kind's help: codec identifier, bitrate mode, size, frame rate and (vbr) quality for
+/// video; codec identifier, sample rate, layout and sample format for audio.
+std::vector<std::string> MissingForBitrates(const Tarvek::Conf::IFormatCodec& codec);
 
 /// The option that gives the setting stored under `key`, or "" for a key no option gives alone.
 std::string OptionForSetting(const std::string& key);

@@ -3,6 +3,7 @@
 #include "Options.h"
 
 #include <algorithm>
+#include <cctype>
 #include <limits>
 #include <numeric>
 #include <optional>
@@ -63,6 +64,11 @@ std::optional<Pair> PositivePair(std::string_view text, char separator) {
 }
 
 char LowerAscii(char c) { return (c >= 'A' && c <= 'Z') ? static_cast<char>(c - 'A' + 'a') : c; }
+
+std::string Lower(std::string text) {
+  for (char& c : text) c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
+  return text;
+}
 
 bool EqualsIgnoringCase(std::string_view a, std::string_view b) {
   return a.size() == b.size() && std::equal(a.begin(), a.end(), b.begin(), [](char x, char y) {
@@ -152,9 +158,22 @@ long long ParseNonNegative(const std::string& option, const std::string& text, l
 long long ParseBitrate(const std::string& option, const std::string& text) {
   std::string_view digits = text;
   std::uint64_t unit = 1;
-  if (!digits.empty() && (digits.back() == 'k' || digits.back() == 'M')) {
-    unit = digits.back() == 'k' ? 1000 : 1000000;
-    digits.remove_suffix(1);
+  if (!digits.empty()) {
+    switch (digits.back()) {
+      case 'k':
+      case 'K':
+        unit = 1000;
+        break;
+      case 'M':
+        unit = 1000000;
+        break;
+      case 'G':
+        unit = 1000000000;
+        break;
+      default:
+        break;
+    }
+    if (unit != 1) digits.remove_suffix(1);
   }
   const std::size_t dot = std::min(digits.find('.'), digits.size());
   const std::string_view fraction = digits.substr(std::min(dot + 1, digits.size()));
@@ -167,7 +186,7 @@ long long ParseBitrate(const std::string& option, const std::string& text) {
     const std::uint64_t bits = *whole * unit + (*decimals * unit + scale / 2) / scale;
     if (bits > 0) return static_cast<long long>(bits);
   }
-  throw BadValue(option, "a positive number of bits per second such as 4500000, 4500k or 4.5M",
+  throw BadValue(option, "a positive number of bits per second such as 4500000, 4500k, 4.5M or 1G",
                  text);
 }
 
@@ -223,13 +242,13 @@ ChannelLayout ParseChannelLayout(const std::string& option, const std::string& t
 }
 
 AVPixelFormat ParsePixelFormat(const std::string& option, const std::string& text) {
-  const AVPixelFormat format = av_get_pix_fmt(text.c_str());
+  const AVPixelFormat format = av_get_pix_fmt(Lower(text).c_str());
   if (format != AV_PIX_FMT_NONE && text.find('\0') == std::string::npos) return format;
   throw BadValue(option, "a pixel format name such as yuv420p", text);
 }
 
 AVSampleFormat ParseSampleFormat(const std::string& option, const std::string& text) {
-  const AVSampleFormat format = av_get_sample_fmt(text.c_str());
+  const AVSampleFormat format = av_get_sample_fmt(Lower(text).c_str());
   if (format != AV_SAMPLE_FMT_NONE && text.find('\0') == std::string::npos) return format;
   throw BadValue(option, "a sample format name such as fltp or s16", text);
 }
@@ -241,6 +260,18 @@ std::pair<std::string, std::string> ParseKeyValue(const std::string& option,
     return {text.substr(0, equals), text.substr(equals + 1)};
   }
   throw BadValue(option, "KEY=VALUE", text);
+}
+
+std::string ParseChoice(const std::string& option, const std::string& text,
+                        const std::vector<std::string>& accepted) {
+  for (const std::string& choice : accepted) {
+    if (EqualsIgnoringCase(choice, text)) return choice;
+  }
+  std::string names;
+  for (std::size_t i = 0; i < accepted.size(); ++i) {
+    names += (i == 0 ? "" : i + 1 == accepted.size() ? " or " : ", ") + accepted[i];
+  }
+  throw BadValue(option, names, text);
 }
 
 std::string CheckCodecId(const std::string& option, const std::string& text,

@@ -44,8 +44,9 @@ Pair ParseFrameRate(const std::string& option, const std::string& text);
 long long ParsePositive(const std::string& option, const std::string& text, long long max);
 /// A decimal integer from 0 to `max`.
 long long ParseNonNegative(const std::string& option, const std::string& text, long long max);
-/// A positive bitrate in bits per second, with an optional k (1000) or M (1000000) suffix that
-/// may follow a decimal: "4500000", "4500k", "4.5M". Rounded to whole bits per second.
+/// A positive bitrate in bits per second, with an optional k or K (1000), M (10^6) or G (10^9)
+/// suffix that may follow a decimal: "4500000", "4500k", "4.5M", "1G". Rounded to whole bits per
+/// second.
 long long ParseBitrate(const std::string& option, const std::string& text);
 /// A codec tag: four characters ("avc1") packed as FFmpeg does, first character in the lowest
 /// byte, or a 32-bit number in decimal or 0x hexadecimal.
@@ -57,14 +58,19 @@ Tarvek::Conf::ChannelLayout ParseChannelLayout(const std::string& option, const 
 /// The layout names ParseChannelLayout takes, in the order of their channel count.
 const std::vector<std::pair<std::string, Tarvek::Conf::ChannelLayout>>& ChannelLayoutNames();
 
-/// A pixel format by libavutil's name ("yuv420p").
+/// A pixel format by libavutil's name ("yuv420p"), in any letter case.
 AVPixelFormat ParsePixelFormat(const std::string& option, const std::string& text);
-/// A sample format by libavutil's name ("fltp", "s16").
+/// A sample format by libavutil's name ("fltp", "s16"), in any letter case.
 AVSampleFormat ParseSampleFormat(const std::string& option, const std::string& text);
 
 /// "KEY=VALUE" with a non-empty key; the value may be empty or hold further '=' signs.
 std::pair<std::string, std::string> ParseKeyValue(const std::string& option,
                                                   const std::string& text);
+
+/// The one of `accepted` that `text` names in any letter case, in its canonical form; otherwise a
+/// UsageError naming the accepted values.
+std::string ParseChoice(const std::string& option, const std::string& text,
+                        const std::vector<std::string>& accepted);
 
 /// `text` when it is one of `known` (compared without regard to ASCII case, as the presets do);
 /// otherwise a UsageError saying that a `kind` codec identifier was expected.

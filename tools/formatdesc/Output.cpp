@@ -6,6 +6,8 @@
 #include <cstdio>
 #include <iomanip>
 #include <iostream>
+#include <string_view>
+#include <unordered_set>
 
 #include <Tarvek/Inspect/JsonLayout.h>
 
@@ -123,9 +125,15 @@ nlohmann::ordered_json TreeJson(const Tarvek::Core::Property& node) {
     default:
       break;
   }
+  // An ordered object looks a key up by a scan on every insertion; the names seen are kept aside
+  // and members appended to its storage directly, so that building it takes linear time.
+  std::unordered_set<std::string_view> seen;
   nlohmann::ordered_json object = nlohmann::ordered_json::object();
+  auto& members = *object.get_ptr<nlohmann::ordered_json::object_t*>();
   for (const Tarvek::Core::Property& child : node.GetChildren()) {
-    if (!object.contains(child.GetName())) object[child.GetName()] = TreeJson(child);
+    if (seen.insert(child.GetName()).second) {
+      members.Container::emplace_back(child.GetName(), TreeJson(child));
+    }
   }
   return object;
 }
@@ -219,7 +227,7 @@ void PrintDescription(IFormatCodec& codec, const std::optional<Bitrates>& bitrat
 nlohmann::ordered_json DescriptionJson(const boost::intrusive_ptr<IFormatCodec>& codec,
                                        const std::optional<Bitrates>& bitrates) {
   nlohmann::ordered_json json = nlohmann::ordered_json::parse(Tarvek::Conf::ToJson(codec));
-  json["settings"] = TreeJson(codec->GetProperty());
+  json["settings"] = SettingsJson(codec->GetProperty());
   const Derived derived = Derive(*codec);
   if (derived.frameAspect) json["frame_aspect"] = RatioText(*derived.frameAspect, ':');
   if (derived.frameRate) {
@@ -233,6 +241,8 @@ nlohmann::ordered_json DescriptionJson(const boost::intrusive_ptr<IFormatCodec>&
   if (bitrates) json["bitrate"] = BitratesJson(*bitrates);
   return json;
 }
+
+nlohmann::ordered_json SettingsJson(const Tarvek::Core::Property& tree) { return TreeJson(tree); }
 
 void PrintLadder(std::ostream& out, const std::string& codecId, Pair frameRate,
                  std::optional<long long> quality, const std::vector<LadderRow>& rows) {
@@ -309,11 +319,17 @@ nlohmann::ordered_json DiffJson(const std::vector<Tarvek::Conf::Difference>& dif
                                  {"differences", nlohmann::ordered_json::array()},
                                  {"compatible", reasons.empty()},
                                  {"reasons", nlohmann::ordered_json::array()}};
+  // Each side as its JSON value where it is a setting, null where the side lacks it, the text
+  // for an order or a root name.
+  const auto side = [](const Tarvek::Core::Property* node, const std::string& text) {
+    if (node != nullptr) return TreeJson(*node);
+    return text.empty() ? nlohmann::ordered_json() : nlohmann::ordered_json(text);
+  };
   for (const auto& d : differences) {
     json["differences"].push_back({{"path", d.path},
                                    {"kind", Tarvek::Conf::DifferenceKindName(d.kind)},
-                                   {"a", d.a},
-                                   {"b", d.b}});
+                                   {"a", side(d.nodeA, d.a)},
+                                   {"b", side(d.nodeB, d.b)}});
   }
   for (const auto& r : reasons) {
     json["reasons"].push_back(

@@ -20,6 +20,10 @@
 
 namespace Formatdesc {
 
+/// A property tree as plain JSON, the tool's "settings": containers as objects (the first child of
+/// a repeated name, as the library's look-ups find it), leaves as their values.
+nlohmann::ordered_json SettingsJson(const Tarvek::Core::Property& tree);
+
 /// "4.50 Mb/s" from 1 Mb/s up, "128.00 kb/s" below, both rounded to two places.
 std::string ReadableBitrate(long long bitsPerSecond);
 /// "4.50 Mb/s (4500000 b/s)".

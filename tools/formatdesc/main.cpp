@@ -50,13 +50,19 @@ struct LadderArgs {
 struct DiffArgs {
   std::string a;
   std::string b;
+  std::optional<std::string> stream;
   bool json = false;
 };
 
 struct ValidateArgs {
   std::string file;
+  std::optional<std::string> stream;
   bool json = false;
 };
+
+constexpr const char* kStreamHelp =
+    "Of a file of several streams (probe --json), the stream to read: an index (2), or the n-th "
+    "of a kind (v:0, a:1, s:0)";
 
 constexpr const char* kFromJsonHelp =
     "Start from the description in FILE (as --json writes it); the options change it";
@@ -91,15 +97,16 @@ void AddSwitch(CLI::App& app, const std::string& name, std::optional<bool>& valu
 
 void AddCodecOptions(CLI::App& app, CodecArgs& args, const std::string& idHelp) {
   AddText(app, "--from-json", args.fromJson, kFromJsonHelp, "FILE");
+  AddText(app, "--stream", args.stream, kStreamHelp, "SPEC");
   const std::string group = "Codec settings";
   AddText(app, "--codec-id", args.codecId, idHelp, "ID")->group(group);
   AddText(app, "--codec-name", args.codecName, "Codec name (free text)")->group(group);
   AddText(app, "--tag", args.tag, "Codec tag: four characters (avc1) or a number", "FOURCC")
       ->group(group);
   AddText(app, "--bitrate-mode", args.bitrateMode,
-          "Bitrate mode: vbr (quality-driven), or any other text such as cbr", "MODE")
+          "Bitrate mode: vbr (quality-driven) or cbr (target bitrate)", "MODE")
       ->group(group);
-  AddText(app, "--bitrate", args.bitrate, "Bitrate in b/s: 4500000, 4500k or 4.5M", "RATE")
+  AddText(app, "--bitrate", args.bitrate, "Bitrate in b/s: 4500000, 4500k, 4.5M or 1G", "RATE")
       ->group(group);
   AddText(app, "--quality", args.quality, "Encoder quality figure for vbr (CRF, qscale)", "N")
       ->group(group);
@@ -222,13 +229,14 @@ void AddDiff(CLI::App& app, DiffArgs& args) {
   diff->add_option("b", args.b, "The description compared with it")
       ->required()
       ->type_name("B.json");
+  AddText(*diff, "--stream", args.stream, kStreamHelp, "SPEC");
   diff->add_flag("--json", args.json, "Print one JSON object instead of text");
   diff->footer(
       "Lists every setting that differs (only in a, only in b, other type, other value, other\n"
       "order), then whether a stream described by b can be used where a is expected (video:\n"
       "size and pixel aspect; audio: sample rate, layout and sample format) and why not.\n"
-      "Exit status: 0 whether or not they differ, 1 when a file holds no description, 2 for bad\n"
-      "usage or a file that cannot be read.");
+      "Exit status: 0 when they are equal, 1 when they differ, 2 for bad usage or a file that\n"
+      "cannot be read or holds no description.");
 }
 
 void AddValidate(CLI::App& app, ValidateArgs& args) {
@@ -236,6 +244,7 @@ void AddValidate(CLI::App& app, ValidateArgs& args) {
   validate->add_option("file", args.file, "The description (as --json writes it)")
       ->required()
       ->type_name("FILE.json");
+  AddText(*validate, "--stream", args.stream, kStreamHelp, "SPEC");
   validate->add_flag("--json", args.json, "Print one JSON object instead of text");
   validate->footer(
       "Prints one line a finding (error or warning) naming the setting, or 'valid'. Errors are\n"
@@ -273,17 +282,58 @@ void Show(const boost::intrusive_ptr<Tarvek::Conf::IFormatCodec>& codec,
   }
 }
 
+std::string LibraryMessage(const Tarvek::Exception& e);
+
+// The bitrates of `codec` by `compute`; when settings they need are missing, the library's error
+// for the first, then every other one missing, so that one run names them all.
+template <class Compute>
+Bitrates BitratesNamingEveryMissing(const boost::intrusive_ptr<Tarvek::Conf::IFormatCodec>& codec,
+                                    Compute compute) {
+  try {
+    return compute();
+  } catch (const Tarvek::Core::ChildNotFound& e) {
+    const std::string* first = boost::get_error_info<Tarvek::Core::ChildNotFound::ChildNameInfo>(e);
+    // The others grouped by the option that gives them; the first one's option gives all the
+    // settings it sets (--size: width and height), so those are not named again.
+    const std::string firstOption = first != nullptr ? OptionForSetting(*first) : std::string();
+    std::vector<std::pair<std::string, std::string>> groups;  // option, keys
+    for (const std::string& key : MissingForBitrates(*codec)) {
+      const std::string option = OptionForSetting(key);
+      if ((first != nullptr && key == *first) || (!option.empty() && option == firstOption)) {
+        continue;
+      }
+      const auto group = std::find_if(groups.begin(), groups.end(),
+                                      [&](const auto& g) { return g.first == option; });
+      if (group == groups.end() || option.empty()) {
+        groups.emplace_back(option, key);
+      } else {
+        group->second += " and " + key;
+      }
+    }
+    std::string others;
+    for (const auto& [option, keys] : groups) {
+      others += (others.empty() ? "" : ", ") + keys + (option.empty() ? "" : " (" + option + ")");
+    }
+    if (others.empty()) throw;
+    throw std::runtime_error(LibraryMessage(e) + "; also missing: " + others);
+  }
+}
+
 void RunVideo(const VideoArgs& args, const ShowFlags& flags) {
   const auto video = BuildVideo(args);
   std::optional<Bitrates> bitrates;
-  if (!flags.noBitrate) bitrates = VideoBitrates(video);
+  if (!flags.noBitrate) {
+    bitrates = BitratesNamingEveryMissing(video, [&] { return VideoBitrates(video); });
+  }
   Show(video, bitrates, flags.json);
 }
 
 void RunAudio(const AudioArgs& args, const ShowFlags& flags) {
   const auto audio = BuildAudio(args);
   std::optional<Bitrates> bitrates;
-  if (!flags.noBitrate) bitrates = AudioBitrates(audio);
+  if (!flags.noBitrate) {
+    bitrates = BitratesNamingEveryMissing(audio, [&] { return AudioBitrates(audio); });
+  }
   Show(audio, bitrates, flags.json);
 }
 
@@ -333,9 +383,15 @@ void RunLadder(const LadderArgs& args) {
   }
 }
 
-void RunDiff(const DiffArgs& args) {
-  const auto a = LoadDescription("", args.a);
-  const auto b = LoadDescription("", args.b);
+// True when the descriptions differ. Every failure is trouble, exit status 2, as diff(1) has it.
+bool RunDiff(const DiffArgs& args) {
+  boost::intrusive_ptr<Tarvek::Conf::IFormatCodec> a, b;
+  try {
+    a = LoadDescription("", args.a, args.stream);
+    b = LoadDescription("", args.b, args.stream);
+  } catch (const LoadError& e) {
+    throw UsageError(e.what());
+  }
   const auto differences = Tarvek::Conf::Diff(a, b);
   const auto reasons = Tarvek::Conf::ExplainCompatibility(a, b);
   if (args.json) {
@@ -343,11 +399,12 @@ void RunDiff(const DiffArgs& args) {
   } else {
     PrintDiff(std::cout, differences, reasons);
   }
+  return !differences.empty();
 }
 
 // True when an error was found.
 bool RunValidate(const ValidateArgs& args) {
-  const auto findings = Tarvek::Conf::Validate(LoadDescription("", args.file));
+  const auto findings = Tarvek::Conf::Validate(LoadDescription("", args.file, args.stream));
   if (args.json) {
     PrintJson(std::cout, FindingsJson(findings));
   } else {
@@ -385,13 +442,12 @@ bool RunProbe(const ProbeArgs& args) {
 }
 
 void RunCodecs(const CodecsArgs& args) {
-  if (args.kind && *args.kind != "video" && *args.kind != "audio") {
-    throw BadValue("--kind", "video or audio", *args.kind);
-  }
+  std::optional<std::string> kind;
+  if (args.kind) kind = ParseChoice("--kind", *args.kind, {"video", "audio"});
   if (args.json) {
-    PrintJson(std::cout, CodecsJson(args.kind));
+    PrintJson(std::cout, CodecsJson(kind));
   } else {
-    PrintCodecs(std::cout, args.kind);
+    PrintCodecs(std::cout, kind);
   }
 }
 
@@ -444,8 +500,21 @@ std::string ExtrasMessage(const CLI::App& app) {
   return shown + " (see " + help + " --help)";
 }
 
+// The first option given twice, in the form the command line has it ("--size"); empty when none.
+std::string RepeatedOption(int argc, char** argv) {
+  std::vector<std::string> seen;
+  for (int i = 1; i < argc; ++i) {
+    const std::string argument = argv[i];
+    if (argument.rfind("--", 0) != 0 || argument == "--") continue;
+    const std::string name = argument.substr(0, argument.find('='));
+    if (std::find(seen.begin(), seen.end(), name) != seen.end()) return name;
+    seen.push_back(name);
+  }
+  return std::string();
+}
+
 // CLI11's message, except where it does not name what was wrong as the command line has it: a
-// switch given a value, an unknown or missing subcommand.
+// switch given a value, an option given twice, an unknown or missing subcommand.
 std::string ParseErrorMessage(const CLI::App& app, const CLI::ParseError& e, int argc,
                               char** argv) {
   const std::string known = "video, audio, subtitle, ladder, codecs, diff, validate or probe";
@@ -453,6 +522,10 @@ std::string ParseErrorMessage(const CLI::App& app, const CLI::ParseError& e, int
     return SwitchValueMessage(argc, argv);
   }
   if (dynamic_cast<const CLI::ExtrasError*>(&e) != nullptr) return ExtrasMessage(app);
+  if (dynamic_cast<const CLI::ArgumentMismatch*>(&e) != nullptr) {
+    const std::string repeated = RepeatedOption(argc, argv);
+    if (!repeated.empty()) return repeated + ": given more than once; it takes one value";
+  }
   if (!app.get_subcommands().empty() || dynamic_cast<const CLI::RequiredError*>(&e) == nullptr) {
     return e.what();
   }
@@ -491,6 +564,11 @@ int Run(int argc, char** argv) {
   AddDiff(app, diff);
   AddValidate(app, validate);
   AddProbe(app, probe);
+  for (int i = 1; i < argc; ++i) {
+    if (std::string(argv[i]) == "--version" && argc != 2) {
+      return Fail("--version takes nothing else (see formatdesc --help)", kUsageError);
+    }
+  }
   try {
     app.parse(argc, argv);
   } catch (const CLI::ParseError& e) {
@@ -506,9 +584,9 @@ int Run(int argc, char** argv) {
   if (name == "subtitle") Show(BuildSubtitle(subtitle), std::nullopt, subtitleFlags.json);
   if (name == "ladder") RunLadder(ladder);
   if (name == "codecs") RunCodecs(codecs);
-  if (name == "diff") RunDiff(diff);
-  const bool invalid =
-      (name == "validate" && RunValidate(validate)) || (name == "probe" && RunProbe(probe));
+  const bool invalid = (name == "diff" && RunDiff(diff)) ||
+                       (name == "validate" && RunValidate(validate)) ||
+                       (name == "probe" && RunProbe(probe));
   if (!std::cout.flush()) return Fail("cannot write to standard output", kLibraryError);
   return invalid ? kLibraryError : 0;
 }
