@@ -267,7 +267,8 @@ void DescribeRotation(Builder& builder, const AVStream& stream) {
   std::int32_t rotation[9];
   bool isRotation = std::isfinite(angle);
   if (isRotation) {
-    av_display_rotation_set(rotation, angle);
+    // libavutil reads angles counter-clockwise and sets them clockwise.
+    av_display_rotation_set(rotation, -angle);
     // The linear part must be the pure rotation (16.16 fixed point, a little rounding allowed),
     // with no projection; the translation is free.
     for (const int i : {0, 1, 3, 4}) {
