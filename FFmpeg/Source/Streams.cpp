@@ -352,8 +352,8 @@ void DescribeContainer(Builder& builder, const AVFormatContext& context, const A
   }
   DescribeDisposition(builder, stream.disposition);
   if (stream.duration > 0 && stream.duration != AV_NOPTS_VALUE && ValidRate(stream.time_base)) {
-    builder.SetInteger(Keys::kDuration,
-                       av_rescale_q(stream.duration, stream.time_base, AV_TIME_BASE_Q));
+    builder.SetInteger(Keys::kDuration, av_rescale_q(stream.duration, stream.time_base,
+                                                     AVRational{1, AV_TIME_BASE}));
   } else if (context.duration > 0 && context.duration != AV_NOPTS_VALUE) {
     builder.SetInteger(Keys::kDuration, context.duration);
   }
