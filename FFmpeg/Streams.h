@@ -14,6 +14,7 @@
 #include <Tarvek/FFmpeg/Export.h>
 #include <Tarvek/Formats.h>
 
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -69,6 +70,19 @@ TARVEK_FFMPEG_API StreamDescription DescribeCodecParameters(const AVCodecParamet
 /// Throws only std::bad_alloc.
 TARVEK_FFMPEG_API StreamDescription DescribeStream(const AVFormatContext& context,
                                                    unsigned int index);
+
+/// The average bitrate of every stream of `context` measured from its packets: reads the whole
+/// file from where it stands (av_read_frame), adds up each stream's packet sizes and divides by
+/// the span of its timestamps. One entry a stream, in bit/s; 0 for a stream without packets or
+/// without a measurable span. `progress`, when given, is called now and then with the share of
+/// the file read (0 to 1). Stops at the first read error other than the end of the file, with
+/// what was measured up to there. Throws only std::bad_alloc and what `progress` throws.
+TARVEK_FFMPEG_API std::vector<long long> MeasureBitrates(
+    AVFormatContext& context, const std::function<void(double)>& progress = {});
+
+/// Sets `bitrate` as the description's bitrate with source "packets" (MeasureBitrates), when it
+/// states none and `bitrate` is positive; returns whether it did. Throws only std::bad_alloc.
+TARVEK_FFMPEG_API bool SetMeasuredBitrate(Conf::IFormatCodec& description, long long bitrate);
 
 /// Writes into `parameters` every field `description` holds (the others are left as they are):
 /// kind, codec identifier, tag, bitrate, private data as extradata, geometry or sample layout,

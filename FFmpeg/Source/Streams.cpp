@@ -17,6 +17,7 @@ extern "C" {
 #include <cstdlib>
 #include <cstring>
 #include <limits>
+#include <memory>
 
 #include "Options.h"
 
@@ -160,9 +161,11 @@ void DescribeVideo(Builder& builder, const AVCodecParameters& parameters) {
   }
   if (av_pix_fmt_desc_get(static_cast<AVPixelFormat>(parameters.format)) != nullptr) {
     video->SetPixelFormat(static_cast<AVPixelFormat>(parameters.format));
-  } else if (parameters.format != AV_PIX_FMT_NONE) {
-    builder.Note("the pixel format " + std::to_string(parameters.format) +
-                 " is unknown to libavutil, so it is left unset");
+  } else {
+    builder.Note(parameters.format == AV_PIX_FMT_NONE
+                     ? std::string("the pixel format is unknown, so it is left unset")
+                     : "the pixel format " + std::to_string(parameters.format) +
+                           " is unknown to libavutil, so it is left unset");
   }
   if (parameters.field_order != AV_FIELD_UNKNOWN) {
     SetNamed(builder, Keys::kFieldOrder, parameters.field_order, AV_FIELD_UNKNOWN,
@@ -205,9 +208,11 @@ void DescribeAudio(Builder& builder, const AVCodecParameters& parameters) {
   if (parameters.frame_size > 0) audio->SetFrameSize(parameters.frame_size);
   if (av_get_sample_fmt_name(static_cast<AVSampleFormat>(parameters.format)) != nullptr) {
     audio->SetSampleFormat(static_cast<AVSampleFormat>(parameters.format));
-  } else if (parameters.format != AV_SAMPLE_FMT_NONE) {
-    builder.Note("the sample format " + std::to_string(parameters.format) +
-                 " is unknown to libavutil, so it is left unset");
+  } else {
+    builder.Note(parameters.format == AV_SAMPLE_FMT_NONE
+                     ? std::string("the sample format is unknown, so it is left unset")
+                     : "the sample format " + std::to_string(parameters.format) +
+                           " is unknown to libavutil, so it is left unset");
   }
 }
 
@@ -425,6 +430,58 @@ StreamDescription DescribeStream(const AVFormatContext& context, unsigned int in
   Builder builder = Describe(*stream.codecpar);
   DescribeContainer(builder, context, stream);
   return builder.Finish();
+}
+
+std::vector<long long> MeasureBitrates(AVFormatContext& context,
+                                       const std::function<void(double)>& progress) {
+  struct Span {
+    long long bytes = 0;
+    std::int64_t first = AV_NOPTS_VALUE;
+    std::int64_t last = AV_NOPTS_VALUE;
+  };
+  std::vector<Span> spans(context.nb_streams);
+  AVPacket* packet = av_packet_alloc();
+  if (packet == nullptr) throw std::bad_alloc();
+  const std::unique_ptr<AVPacket*, void (*)(AVPacket**)> owned(&packet, av_packet_free);
+  const std::int64_t size = context.pb != nullptr ? avio_size(context.pb) : -1;
+  long long count = 0;
+  while (av_read_frame(&context, packet) >= 0) {
+    const auto index = static_cast<std::size_t>(packet->stream_index);
+    if (index < spans.size()) {
+      Span& span = spans[index];
+      span.bytes += packet->size;
+      const std::int64_t start = packet->pts != AV_NOPTS_VALUE ? packet->pts : packet->dts;
+      if (start != AV_NOPTS_VALUE) {
+        const std::int64_t end = start + std::max<std::int64_t>(packet->duration, 0);
+        if (span.first == AV_NOPTS_VALUE || start < span.first) span.first = start;
+        if (span.last == AV_NOPTS_VALUE || end > span.last) span.last = end;
+      }
+    }
+    av_packet_unref(packet);
+    if (progress && size > 0 && ++count % 256 == 0) {
+      progress(static_cast<double>(avio_tell(context.pb)) / static_cast<double>(size));
+    }
+  }
+  if (progress) progress(1.0);
+  std::vector<long long> bitrates(spans.size(), 0);
+  for (std::size_t i = 0; i < spans.size(); ++i) {
+    const Span& span = spans[i];
+    const AVRational base = context.streams[i]->time_base;
+    if (span.first == AV_NOPTS_VALUE || span.last <= span.first || !ValidRate(base)) continue;
+    const double seconds = static_cast<double>(span.last - span.first) * av_q2d(base);
+    const double bitrate = static_cast<double>(span.bytes) * 8.0 / seconds;
+    if (seconds > 0.0 && bitrate >= 1.0 && bitrate < 9.0e18) bitrates[i] = std::llround(bitrate);
+  }
+  return bitrates;
+}
+
+bool SetMeasuredBitrate(IFormatCodec& description, long long bitrate) {
+  if (description.ExistsBitrate() || bitrate <= 0) return false;
+  description.SetBitrate(bitrate);
+  Core::Property metadata = description.GetMetadata();
+  metadata.SetChildT<std::string>(Keys::kBitrateSource, BitrateSourceName(BitrateSource::kPackets));
+  description.SetMetadata(metadata);
+  return true;
 }
 
 std::vector<std::string> ToCodecParameters(const IFormatCodec& description,

@@ -358,6 +358,7 @@ TEST(FFmpegStreamsTest, ContainerView) {
   stream->codecpar->codec_id = AV_CODEC_ID_HEVC;
   stream->codecpar->width = 1920;
   stream->codecpar->height = 1080;
+  stream->codecpar->format = AV_PIX_FMT_YUV420P10LE;
   stream->r_frame_rate = {30, 1};
   stream->disposition = AV_DISPOSITION_DEFAULT | AV_DISPOSITION_FORCED;
   av_dict_set(&stream->metadata, "title", "Phone", 0);
