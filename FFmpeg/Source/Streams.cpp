@@ -14,6 +14,7 @@ extern "C" {
 }
 
 #include <cmath>
+#include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <limits>
@@ -52,8 +53,6 @@ class Builder {
     metadata_.SetChildT<std::string>(key, value);
   }
   bool Has(const char* key) const { return metadata_.ChildExists(key); }
-  // Reloads the metadata copy after a setter (the audio language) wrote into the child itself.
-  void Reload() { metadata_ = description_->GetMetadata(); }
 
   StreamDescription Finish() {
     description_->SetMetadata(metadata_);
@@ -200,8 +199,10 @@ void DescribeAudio(Builder& builder, const AVCodecParameters& parameters) {
                  (layout.order == AV_CHANNEL_ORDER_UNSPEC ? "unspecified" : "a custom one") +
                  "), so the channel layout is left unset");
   } else if (layout.u.mask > std::numeric_limits<std::uint32_t>::max()) {
-    builder.Note("the layout " + ChannelLayoutName(layout.u.mask) +
-                 " names speakers beyond the description's 32, so it is left unset");
+    char hex[32];
+    std::snprintf(hex, sizeof hex, "0x%llx", static_cast<unsigned long long>(layout.u.mask));
+    builder.Note(std::string("the speaker mask ") + hex +
+                 " names speakers beyond the library's 32, so the channel layout is left unset");
   } else {
     audio->SetChannelLayout(static_cast<Conf::ChannelLayout>(layout.u.mask));
   }
@@ -343,10 +344,10 @@ void DescribeContainer(Builder& builder, const AVFormatContext& context, const A
       builder.SetText(Keys::kLanguage, language);
     }
   }
-  if (auto* audio = builder.As<IFormatCodecAudio>()) {
+  // An audio description keeps its language in the metadata child (IFormatCodecAudio).
+  if (builder.As<IFormatCodecAudio>() != nullptr) {
     if (const char* language = Tag(stream.metadata, "language")) {
-      audio->SetLanguage(language);
-      builder.Reload();
+      builder.SetText(IFormatCodec::TAG_LANGUAGE.c_str(), language);
     }
   }
   if (auto* subtitle = builder.As<IFormatCodecSubtitle>()) {

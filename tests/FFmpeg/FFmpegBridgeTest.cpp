@@ -377,6 +377,19 @@ TEST(FFmpegStreamsTest, ContainerView) {
   EXPECT_EQ(metadata[FFmpeg::Keys::kDisposition].GetString(), "default+forced");
   EXPECT_EQ(metadata[FFmpeg::Keys::kTitle].GetString(), "Phone");
   EXPECT_EQ(described.notes.size(), 2u);  // no pixel aspect, no average frame rate
+
+  // A second stream: the container's total is no longer this stream's; the language sits in
+  // the metadata beside the values without setters.
+  AVStream* audio = avformat_new_stream(context.get(), nullptr);
+  audio->codecpar->codec_type = AVMEDIA_TYPE_AUDIO;
+  audio->codecpar->codec_id = AV_CODEC_ID_FLAC;
+  audio->codecpar->bit_rate = 800000;
+  av_dict_set(&audio->metadata, "language", "eng", 0);
+  const auto described2 = FFmpeg::DescribeStream(*context, 1);
+  const auto flac = boost::dynamic_pointer_cast<Conf::IFormatCodecAudio>(described2.description);
+  EXPECT_EQ(flac->GetLanguage(), "eng");
+  EXPECT_EQ(FFmpeg::GetBitrateSource(*flac), FFmpeg::BitrateSource::kStream);
+  EXPECT_FALSE(FFmpeg::DescribeStream(*context, 0).description->ExistsBitrate());
 }
 
 }  // namespace
