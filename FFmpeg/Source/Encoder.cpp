@@ -106,10 +106,16 @@ class Settings {
     out_.arguments.push_back(value);
   }
   void Note(std::string note) { out_.notes.push_back(std::move(note)); }
+  // Codec flags are gathered and set once ("+qscale+global_header"), as one option.
+  void AddFlag(const char* flag) { flags_ += std::string("+") + flag; }
+  void Finish() {
+    if (!flags_.empty()) Set("flags", flags_);
+  }
 
  private:
   EncoderSettings& out_;
   char stream_;
+  std::string flags_;
 };
 
 const EncoderRow* FindEncoder(AVCodecID codec) {
@@ -169,7 +175,7 @@ void RateControl(Settings& settings, const IFormatCodec& description, const Enco
         return;
       case Quality::kQscale:
         if (q < 0 || q > std::numeric_limits<int>::max() / FF_QP2LAMBDA) break;
-        settings.Set("flags", "+qscale");
+        settings.AddFlag("qscale");
         settings.Set("global_quality", q * FF_QP2LAMBDA);
         return;
       case Quality::kOpusVbr:
@@ -286,11 +292,11 @@ EncoderSettings MakeEncoderSettings(const IFormatCodec& description) {
 
   RateControl(settings, description, row, type == 0);
   if (description.ExistsTwoPassEncoding() && description.GetTwoPassEncoding()) {
-    settings.Set("flags", "+pass1");
+    settings.AddFlag("pass1");
   }
   if (description.ExistsThreadNumber()) settings.Set("threads", description.GetThreadNumber());
   if (description.ExistsGlobalHeader() && description.GetGlobalHeader()) {
-    settings.Set("flags", "+global_header");
+    settings.AddFlag("global_header");
   }
   if (description.ExistsLossless() && description.GetLossless()) {
     if (out.encoder == "libx264") {
@@ -312,6 +318,7 @@ EncoderSettings MakeEncoderSettings(const IFormatCodec& description) {
   if (const auto* audio = dynamic_cast<const IFormatCodecAudio*>(&description)) {
     AudioSettings(settings, out, *audio);
   }
+  settings.Finish();
   if (description.ExistsOptionsEncode()) {
     for (const Core::Property& option : description.GetOptionsEncode().GetChildren()) {
       const std::string value = OptionValue(option);

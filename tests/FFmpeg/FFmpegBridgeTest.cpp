@@ -98,6 +98,7 @@ boost::intrusive_ptr<Conf::IFormatCodec> Describe(const EncoderCase& c) {
   }
   description->SetCodecID(c.codecId);
   description->SetThreadNumber(1);
+  description->SetGlobalHeader(true);
   if (c.mode[0] != '\0') description->SetBitrateMode(c.mode);
   if (std::string(c.mode) == "vbr") {
     description->SetQuality(c.bitrateOrQuality);
@@ -133,6 +134,7 @@ TEST_P(EncoderTest, OpensWithTheSettingsAndRoundTrips) {
   ASSERT_EQ(FFmpeg::OpenEncoder(settings, *context, &left), 0) << settings.encoder;
   EXPECT_TRUE(left.empty()) << settings.encoder << " left " << left.front();
   EXPECT_EQ(context->thread_count, 1);
+  EXPECT_NE(context->flags & AV_CODEC_FLAG_GLOBAL_HEADER, 0) << settings.encoder;
   const std::string mode = c.mode;
   if (mode == "cbr") {
     EXPECT_EQ(context->bit_rate, c.bitrateOrQuality) << settings.encoder;
