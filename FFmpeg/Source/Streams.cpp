@@ -142,7 +142,8 @@ void DescribeCommon(Builder& builder, const AVCodecParameters& parameters) {
   }
 }
 
-void DescribeVideo(Builder& builder, const AVCodecParameters& parameters) {
+// `alone`: the codec parameters are all there is; a container may still give the pixel aspect.
+void DescribeVideo(Builder& builder, const AVCodecParameters& parameters, bool alone) {
   auto* video = builder.As<Conf::FormatCodecVideo>();
   if (ValidSize(parameters.width, parameters.height)) {
     video->SetWidth(static_cast<unsigned int>(parameters.width));
@@ -157,6 +158,8 @@ void DescribeVideo(Builder& builder, const AVCodecParameters& parameters) {
     av_reduce(&reduced.num, &reduced.den, aspect.num, aspect.den, std::numeric_limits<int>::max());
     video->SetPixelAspectX(static_cast<unsigned int>(reduced.num));
     video->SetPixelAspectY(static_cast<unsigned int>(reduced.den));
+  } else if (alone) {
+    builder.Note("the pixel aspect is unknown (0:1), so it is left unset");
   }
   if (av_pix_fmt_desc_get(static_cast<AVPixelFormat>(parameters.format)) != nullptr) {
     video->SetPixelFormat(static_cast<AVPixelFormat>(parameters.format));
@@ -240,11 +243,11 @@ void DescribeSubtitle(Builder& builder, const AVCodecParameters& parameters) {
   }
 }
 
-Builder Describe(const AVCodecParameters& parameters) {
+Builder Describe(const AVCodecParameters& parameters, bool alone) {
   const AVMediaType kind = KindOf(parameters);
   Builder builder(CreateFor(kind));
   DescribeCommon(builder, parameters);
-  if (kind == AVMEDIA_TYPE_VIDEO) DescribeVideo(builder, parameters);
+  if (kind == AVMEDIA_TYPE_VIDEO) DescribeVideo(builder, parameters, alone);
   if (kind == AVMEDIA_TYPE_AUDIO) DescribeAudio(builder, parameters);
   if (kind == AVMEDIA_TYPE_SUBTITLE) DescribeSubtitle(builder, parameters);
   return builder;
@@ -417,7 +420,7 @@ bool FitsInt(long long value) { return value > 0 && value <= std::numeric_limits
 }  // namespace
 
 StreamDescription DescribeCodecParameters(const AVCodecParameters& parameters) {
-  return Describe(parameters).Finish();
+  return Describe(parameters, true).Finish();
 }
 
 StreamDescription DescribeStream(const AVFormatContext& context, unsigned int index) {
@@ -428,7 +431,7 @@ StreamDescription DescribeStream(const AVFormatContext& context, unsigned int in
     return builder.Finish();
   }
   const AVStream& stream = *context.streams[index];
-  Builder builder = Describe(*stream.codecpar);
+  Builder builder = Describe(*stream.codecpar, false);
   DescribeContainer(builder, context, stream);
   return builder.Finish();
 }
