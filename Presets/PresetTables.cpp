@@ -141,7 +141,7 @@ constexpr double kMpeg4Factor = 1.5;  // AVC-GOAL: H.264 half or less of MPEG-4 
 constexpr double kMpeg1Factor = 2.0;   // VCD: 1150 kbit/s at 352x288/25 is 2.1x the ladder there
                                        // (derived), as MPEG-2 (NIST)
 constexpr double kVp8Factor = 1.0;     // VP8 as H.264 (assumption: no comparable published figure)
-constexpr double kTheoraFactor = 1.5;  // Theora as MPEG-4 Part 2 (assumption)
+constexpr double kTheoraFactor = 1.5;  // Theora as mpeg4 (assumption)
 // Motion JPEG codes every frame alone, like the key frames of the other codecs, which run at
 // several times a predicted frame's size: 10x the ladder (assumption, no published figure).
 constexpr double kMjpegFactor = 10.0;

@@ -386,7 +386,7 @@ TEST(FFmpegStreamsTest, ContainerView) {
   EXPECT_EQ(metadata[FFmpeg::Keys::kTitle].GetString(), "Phone");
   EXPECT_EQ(described.notes.size(), 2u);  // no pixel aspect, no average frame rate
 
-  // A second stream: the container's total is no longer this stream's; the language sits in
+  // A second stream: the container's total is not this stream's alone; the language sits in
   // the metadata beside the values without setters.
   AVStream* audio = avformat_new_stream(context.get(), nullptr);
   audio->codecpar->codec_type = AVMEDIA_TYPE_AUDIO;
