@@ -21,6 +21,11 @@
 //   LAME        lame(1);  OPUS, OPUSENC  Opus API documentation, opusenc defaults
 //   VORBIS, FLAC, ALAC, DD, EAC3   codec summaries of those formats
 //   RFC7845     Ogg Opus, section 5.1.1.2 (channel mapping family 1)
+//   VCD         Video CD (White Book): MPEG-1 video 1150 kbit/s at 352x288/25 and 352x240/29.97
+//   DVD         DVD-Video: MPEG-1 video at most 1.856 Mbit/s; DTS at 754.5 or 1509.75 kbit/s
+//   DTS         DTS Coherent Acoustics core: 32-1536 kbit/s (1509.75 on CD and DVD), up to 5.1,
+//               sample rates up to 48 kHz
+//   TRUEHD      Dolby TrueHD (MLP): lossless, up to 24-bit samples, 18 Mbit/s peak (Blu-ray)
 // "derived" marks arithmetic on sourced figures; "assumption" marks a choice no source fixes.
 #include "PresetTables.h"
 
@@ -133,6 +138,26 @@ constexpr double kMpeg2Factor = 2.0;  // NIST: AVC needs about half the MPEG-2 b
 constexpr double kMpeg4Factor = 1.5;  // AVC-GOAL: H.264 half or less of MPEG-4 Part 2; between
                                       // H.264 and MPEG-2 (assumption, no direct figure)
 
+constexpr double kMpeg1Factor = 2.0;   // VCD: 1150 kbit/s at 352x288/25 is 2.1x the ladder there
+                                       // (derived), as MPEG-2 (NIST)
+constexpr double kVp8Factor = 1.0;     // VP8 as H.264 (assumption: no comparable published figure)
+constexpr double kTheoraFactor = 1.5;  // Theora as mpeg4 (assumption)
+// Motion JPEG codes every frame alone, like the key frames of the other codecs, which run at
+// several times a predicted frame's size: 10x the ladder (assumption, no published figure).
+constexpr double kMjpegFactor = 10.0;
+
+// Compressed lossless video, in bits per pixel of each frame at the reference frame rate 1 (a
+// fixed share of the uncompressed frame, so linear in pixels and frame rate). FFV1 at half of
+// 8-bit 4:2:0 (12 bit per pixel), PNG at half of RGB24 (24 bit per pixel); the range a quarter
+// of uncompressed to uncompressed and more for deeper formats (assumption: lossless ratios
+// depend on the picture; 2:1 is the usual figure).
+constexpr LadderPoint kFfv1Points[] = {{k1080Pixels, k1080Pixels * 6.0}};
+constexpr LadderPoint kPngPoints[] = {{k1080Pixels, k1080Pixels * 12.0}};
+constexpr Ladder kFfv1{MakeTable(kFfv1Points), 1.0, 1.0, 1.0};
+constexpr Ladder kPng{MakeTable(kPngPoints), 1.0, 1.0, 1.0};
+constexpr double kLosslessVideoMinFactor = 0.25;
+constexpr double kLosslessVideoMaxFactor = 4.0;
+
 // Range around the default for the software codecs.
 constexpr double kVbrMinFactor = 0.5;  // VP9-G: constrained quality, min rate 50 % of target
 constexpr double kVbrMaxFactor = 2.0;  // HLS: VOD peak at most 200 % of the average
@@ -235,18 +260,25 @@ constexpr VideoCodec kVideoCodecRows[] = {
     {"dnxhr_hqx", &kDnxhrHq, 1.0, nullptr, 1.0, 1.0, nullptr},  // DNXHR: same size as HQ
     {"dnxhr_lb", &kDnxhrLb, 1.0, nullptr, 1.0, 1.0, nullptr},
     {"dnxhr_sq", &kDnxhrSq, 1.0, nullptr, 1.0, 1.0, nullptr},
+    {"ffv1", &kFfv1, 1.0, nullptr, kLosslessVideoMinFactor, kLosslessVideoMaxFactor, nullptr},
     {"h264", &kH264Ladder, 1.0, &kX264Crf, kVbrMinFactor, kVbrMaxFactor, &kH264Levels},
     {"hevc", &kH264Ladder, kHevcFactor, &kX265Crf, kVbrMinFactor, kVbrMaxFactor, &kHevcLevels},
+    {"mjpeg", &kH264Ladder, kMjpegFactor, &kMpegQscale, kVbrMinFactor, kVbrMaxFactor, nullptr},
+    {"mpeg1video", &kH264Ladder, kMpeg1Factor, &kMpegQscale, kVbrMinFactor, kVbrMaxFactor, nullptr},
     {"mpeg2video", &kH264Ladder, kMpeg2Factor, &kMpegQscale, kVbrMinFactor, kVbrMaxFactor,
      &kMpeg2Levels},
     {"mpeg4", &kH264Ladder, kMpeg4Factor, &kMpegQscale, kVbrMinFactor, kVbrMaxFactor,
      &kMpeg4Levels},
+    {"png", &kPng, 1.0, nullptr, kLosslessVideoMinFactor, kLosslessVideoMaxFactor, nullptr},
     {"prores", &kProRes422, 1.0, nullptr, kProResMinFactor, 1.0, nullptr},  // ProRes 422
     {"prores_4444", &kProRes4444, 1.0, nullptr, kProResMinFactor, 1.0, nullptr},
     {"prores_4444xq", &kProRes4444Xq, 1.0, nullptr, kProResMinFactor, 1.0, nullptr},
     {"prores_hq", &kProResHq, 1.0, nullptr, kProResMinFactor, 1.0, nullptr},
     {"prores_lt", &kProResLt, 1.0, nullptr, kProResMinFactor, 1.0, nullptr},
     {"prores_proxy", &kProResProxy, 1.0, nullptr, kProResMinFactor, 1.0, nullptr},
+    {"theora", &kH264Ladder, kTheoraFactor, nullptr, kVbrMinFactor, kVbrMaxFactor, nullptr},
+    // libvpx's VP8 crf has the range of its VP9 one (FF-ENC); the same scale (assumption).
+    {"vp8", &kH264Ladder, kVp8Factor, &kVpxAomCrf, kVbrMinFactor, kVbrMaxFactor, nullptr},
     {"vp9", &kH264Ladder, kVp9Factor, &kVpxAomCrf, kVbrMinFactor, kVbrMaxFactor, &kVp9Levels},
 };
 
@@ -261,6 +293,12 @@ constexpr int kAc3Kbps[] = {32,  40,  48,  56,  64,  80,  96,  112, 128, 160,
                             192, 224, 256, 320, 384, 448, 512, 576, 640};
 
 constexpr Table<int> kAnyBitrate{};
+
+// MPA: MPEG-1 Layer II bitrates, kbit/s.
+constexpr int kMp2Kbps[] = {32, 48, 56, 64, 80, 96, 112, 128, 160, 192, 224, 256, 320, 384};
+// DTS: the core's nominal bitrates, kbit/s (1509.75 on CD and DVD is carried as 1536 here).
+constexpr int kDtsKbps[] = {32,  56,  64,  96,  112, 128,  192,  224,  256,  320,  384,  448,
+                            512, 576, 640, 768, 960, 1024, 1152, 1280, 1344, 1408, 1472, 1536};
 
 constexpr ChannelAnchor kAacLcDefaults[] = {
     {2, 128000},  // FF-AAC: about 64 kbps a channel, 128 kbps stereo
@@ -382,6 +420,36 @@ constexpr LossyAudio kEac3{
     nullptr,                   // low-rate variant
 };
 
+constexpr ChannelAnchor kMp2Defaults[] = {
+    {2, 224000},  // FF-TGT: 224 kbit/s stereo (SVCD target)
+};
+constexpr LossyAudio kMp2{
+    // MPEG-1 Layer II
+    {1, 2},                   // channels: MPA, mono to stereo
+    {32000, 48000},           // rates: MPA, MPEG-1
+    MakeTable(kMp2Defaults),  // default
+    true,                     // full band: scales with the sample rate
+    {32000, 0, 0},            // min: MPA, 32 kbit/s
+    {384000, 0, 0},           // max: MPA, 384 kbit/s
+    MakeTable(kMp2Kbps),      // bitrates
+    nullptr,                  // low-rate variant
+};
+
+constexpr ChannelAnchor kDtsDefaults[] = {
+    {6, 768000},  // DVD: DTS 5.1 at 754.5 kbit/s, nominally 768
+};
+constexpr LossyAudio kDts{
+    // DTS Coherent Acoustics core
+    {1, 6},                   // channels: DTS, up to 5.1
+    {8000, 48000},            // rates: DTS, up to 48 kHz
+    MakeTable(kDtsDefaults),  // default; fewer channels in proportion (assumption)
+    true,                     // full band: scales with the sample rate
+    {32000, 0, 0},            // min: DTS, 32 kbit/s
+    {1536000, 0, 0},          // max: DTS, DVD, 1536 kbit/s
+    MakeTable(kDtsKbps),      // bitrates
+    nullptr,                  // low-rate variant
+};
+
 // RFC7845: streams and coupled streams of channel mapping family 1, which libopus uses for
 // 1-8 channels. Above 8 channels every channel is its own uncoupled stream.
 constexpr OpusLayout kOpusLayouts[] = {
@@ -405,6 +473,9 @@ constexpr OpusFigures kOpus{
 // verbatim); minimum below every published figure. Both store integer samples up to 32 bits.
 constexpr LosslessAudio kFlac{0.3, 0.6, 1.0, 32};  // FLAC
 constexpr LosslessAudio kAlac{0.3, 0.6, 1.0, 32};  // ALAC
+// TRUEHD: lossless up to 24 bits, which decode into 32-bit samples; its compression taken as
+// FLAC's (assumption).
+constexpr LosslessAudio kTrueHd{0.3, 0.6, 1.0, 32};
 
 constexpr AudioCodec Lossy(const char* id, const LossyAudio& figures) {
   return AudioCodec{id, AudioKind::kLossy, &figures, nullptr, 0};
@@ -424,8 +495,10 @@ constexpr AudioCodec kAudioCodecRows[] = {
     Lossy("aac_he_v2", kAacHeV2),
     Lossy("ac3", kAc3),
     Lossless("alac", kAlac),
+    Lossy("dts", kDts),
     Lossy("eac3", kEac3),
     Lossless("flac", kFlac),
+    Lossy("mp2", kMp2),
     Lossy("mp3", kMp3),
     AudioCodec{"opus", AudioKind::kOpus, nullptr, nullptr, 0},
     Pcm("pcm_alaw", 8),  // G.711 A-law: 64 kbps at 8 kHz (AOSP)
@@ -455,6 +528,7 @@ constexpr AudioCodec kAudioCodecRows[] = {
     Pcm("pcm_u32be", 32),
     Pcm("pcm_u32le", 32),
     Pcm("pcm_u8", 8),
+    Lossless("truehd", kTrueHd),
     Lossy("vorbis", kVorbis),
 };
 

@@ -169,10 +169,12 @@ TEST(BitratePresetsTest, CodecListsAreSortedAndCoverTheCommonCodecs) {
   const auto& audio = GetPresetAudioCodecs();
   EXPECT_TRUE(std::is_sorted(video.begin(), video.end()));
   EXPECT_TRUE(std::is_sorted(audio.begin(), audio.end()));
-  for (const char* id : {"h264", "hevc", "vp9", "av1", "mpeg2video", "mpeg4", "prores", "dnxhd"})
+  for (const char* id : {"h264", "hevc", "vp9", "av1", "mpeg2video", "mpeg4", "prores", "dnxhd",
+                         "vp8", "mpeg1video", "mjpeg", "theora", "ffv1", "png"})
     EXPECT_NE(std::find(video.begin(), video.end(), id), video.end()) << id;
-  for (const char* id : {"aac", "mp3", "opus", "vorbis", "ac3", "eac3", "flac", "alac", "pcm_s16le",
-                         "pcm_s24le", "pcm_f32le", "pcm_u8", "pcm_mulaw"})
+  for (const char* id :
+       {"aac", "mp3", "opus", "vorbis", "ac3", "eac3", "flac", "alac", "mp2", "dts", "truehd",
+        "pcm_s16le", "pcm_s24le", "pcm_f32le", "pcm_u8", "pcm_mulaw"})
     EXPECT_NE(std::find(audio.begin(), audio.end(), id), audio.end()) << id;
 }
 
@@ -207,13 +209,18 @@ TEST(BitratePresetsTest, VideoSpotValuesMatchThePublishedFigures) {
   EXPECT_EQ(GetDefaultVideoBitrate("dnxhr_hq", 3840, 2160, 25, 18), 728'268'800);
   EXPECT_EQ(GetMaxVideoBitrate("dnxhd", 1920, 1080, 25, -1), 917504LL * 8 * 25);  // CID 1238
   EXPECT_EQ(GetDefaultVideoBitrate("H264", 1920, 1080, 30, -1), 8'000'000);       // any case
+  // Lossless video: half the uncompressed frame (FFV1 of 12-bit 4:2:0, PNG of RGB24).
+  EXPECT_EQ(GetDefaultVideoBitrate("ffv1", 1920, 1080, 25, -1), 1920LL * 1080 * 6 * 25);
+  EXPECT_EQ(GetMaxVideoBitrate("png", 1920, 1080, 25, -1), 1920LL * 1080 * 48 * 25);
 }
 
 TEST(BitratePresetsTest, QualityMovesTheSoftwareCodecsOnly) {
   for (const std::string& id : GetPresetVideoCodecs()) {
     const std::int64_t fine = GetDefaultVideoBitrate(id, 1280, 720, 30, 10);
     const std::int64_t coarse = GetDefaultVideoBitrate(id, 1280, 720, 30, 40);
-    const bool fixedRate = id.rfind("prores", 0) == 0 || id.rfind("dnx", 0) == 0;
+    // Fixed-rate and lossless codecs, and Theora, whose quality scale has no published rates.
+    const bool fixedRate = id.rfind("prores", 0) == 0 || id.rfind("dnx", 0) == 0 || id == "ffv1" ||
+                           id == "png" || id == "theora";
     if (fixedRate) {
       EXPECT_EQ(fine, coarse) << id;
     } else {
@@ -225,6 +232,9 @@ TEST(BitratePresetsTest, QualityMovesTheSoftwareCodecsOnly) {
 TEST(BitratePresetsTest, AudioSpotValuesMatchThePublishedFigures) {
   const auto stereo = CH_LAYOUT_STEREO;
   EXPECT_EQ(GetDefaultAudioBitrate("pcm_s16le", 48000, stereo, AV_SAMPLE_FMT_S16), 1'536'000);
+  EXPECT_EQ(GetDefaultAudioBitrate("mp2", 48000, stereo, AV_SAMPLE_FMT_S16), 224'000);  // FF-TGT
+  EXPECT_EQ(GetDefaultAudioBitrate("dts", 48000, CH_LAYOUT_5POINT1, AV_SAMPLE_FMT_S32),
+            768'000);                                                                       // DVD
   EXPECT_EQ(GetMinAudioBitrate("pcm_s16le", 44100, stereo, AV_SAMPLE_FMT_S16), 1'411'200);  // CD
   EXPECT_EQ(GetMaxAudioBitrate("pcm_s24le", 96000, CH_LAYOUT_5POINT1, AV_SAMPLE_FMT_S32),
             96000 * 6 * 24);  // the identifier fixes 24 bits, whatever the sample format

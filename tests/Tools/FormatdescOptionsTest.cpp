@@ -99,9 +99,11 @@ TEST(FormatdescOptions, CodecTagPacksFourCharactersFirstLowest) {
 }
 
 TEST(FormatdescOptions, ChannelLayoutByNameOrMask) {
-  EXPECT_EQ(ParseChannelLayout("--layout", "5.1"), Tarvek::Conf::CH_LAYOUT_5POINT1);
+  // FFmpeg's names: its "5.1" has back speakers, "5.1(side)" side ones.
+  EXPECT_EQ(ParseChannelLayout("--layout", "5.1"), Tarvek::Conf::CH_LAYOUT_5POINT1_BACK);
+  EXPECT_EQ(ParseChannelLayout("--layout", "5.1(side)"), Tarvek::Conf::CH_LAYOUT_5POINT1);
   EXPECT_EQ(ParseChannelLayout("--layout", "Stereo"), Tarvek::Conf::CH_LAYOUT_STEREO);
-  EXPECT_EQ(ParseChannelLayout("--layout", "7.1(wide)"), Tarvek::Conf::CH_LAYOUT_7POINT1_WIDE);
+  EXPECT_EQ(ParseChannelLayout("--layout", "7.1(wide-side)"), Tarvek::Conf::CH_LAYOUT_7POINT1_WIDE);
   EXPECT_EQ(ParseChannelLayout("--layout", "0x3f"), Tarvek::Conf::CH_LAYOUT_5POINT1_BACK);
   EXPECT_EQ(ParseChannelLayout("--layout", "4"), Tarvek::Conf::CH_LAYOUT_MONO);
   for (const char* bad : {"0", "0x0", "5.2", "0x100000000", ""}) {

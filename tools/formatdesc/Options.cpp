@@ -2,6 +2,8 @@
 // std::stoul and friends, which accept signs, spaces and trailing junk.
 #include "Options.h"
 
+#include <Tarvek/FFmpeg/Names.h>
+
 #include <algorithm>
 #include <cctype>
 #include <limits>
@@ -10,6 +12,7 @@
 #include <string_view>
 
 extern "C" {
+#include <libavutil/channel_layout.h>
 #include <libavutil/pixdesc.h>
 #include <libavutil/samplefmt.h>
 }
@@ -205,39 +208,31 @@ long long ParseCodecTag(const std::string& option, const std::string& text) {
 }
 
 const std::vector<std::pair<std::string, ChannelLayout>>& ChannelLayoutNames() {
-  using namespace Tarvek::Conf;
-  static const std::vector<std::pair<std::string, ChannelLayout>> names = {
-      {"mono", CH_LAYOUT_MONO},
-      {"stereo", CH_LAYOUT_STEREO},
-      {"2.1", CH_LAYOUT_2POINT1},
-      {"3.0", CH_LAYOUT_SURROUND},
-      {"surround", CH_LAYOUT_SURROUND},
-      {"3.0(back)", CH_LAYOUT_2_1},
-      {"3.1", CH_LAYOUT_3POINT1},
-      {"4.0", CH_LAYOUT_4POINT0},
-      {"quad", CH_LAYOUT_QUAD},
-      {"quad(side)", CH_LAYOUT_2_2},
-      {"4.1", CH_LAYOUT_4POINT1},
-      {"5.0", CH_LAYOUT_5POINT0},
-      {"5.0(back)", CH_LAYOUT_5POINT0_BACK},
-      {"5.1", CH_LAYOUT_5POINT1},
-      {"5.1(back)", CH_LAYOUT_5POINT1_BACK},
-      {"6.0", CH_LAYOUT_6POINT0},
-      {"6.1", CH_LAYOUT_6POINT1},
-      {"7.0", CH_LAYOUT_7POINT0},
-      {"7.1", CH_LAYOUT_7POINT1},
-      {"7.1(wide)", CH_LAYOUT_7POINT1_WIDE},
-  };
+  // libavutil's standard layouts that a description's 32-bit mask holds, named as it names them.
+  static const std::vector<std::pair<std::string, ChannelLayout>> names = [] {
+    std::vector<std::pair<std::string, ChannelLayout>> list;
+    void* position = nullptr;
+    while (const AVChannelLayout* layout = av_channel_layout_standard(&position)) {
+      if (layout->order != AV_CHANNEL_ORDER_NATIVE || layout->u.mask > kMaxUint32) continue;
+      list.emplace_back(Tarvek::FFmpeg::ChannelLayoutName(layout->u.mask),
+                        static_cast<ChannelLayout>(layout->u.mask));
+    }
+    return list;
+  }();
   return names;
 }
 
 ChannelLayout ParseChannelLayout(const std::string& option, const std::string& text) {
-  for (const auto& [name, layout] : ChannelLayoutNames()) {
-    if (EqualsIgnoringCase(name, text)) return layout;
+  // libavutil's reading, and its names in any case ("Stereo").
+  std::string lower = text;
+  std::transform(lower.begin(), lower.end(), lower.begin(),
+                 [](unsigned char c) { return static_cast<char>(std::tolower(c)); });
+  for (const std::string& candidate : {text, lower}) {
+    if (const auto layout = Tarvek::FFmpeg::ParseChannelLayout(candidate)) return *layout;
   }
-  const auto mask = Number(text, kMaxUint32);
-  if (mask && *mask != 0) return static_cast<ChannelLayout>(*mask);
-  throw BadValue(option, "a channel layout such as mono, stereo or 5.1, or a non-zero speaker mask",
+  throw BadValue(option,
+                 "a channel layout such as mono, stereo, 5.1 or 5.1(side) (FFmpeg's names), or a "
+                 "non-zero speaker mask",
                  text);
 }
 

@@ -52,10 +52,10 @@ long long ParseBitrate(const std::string& option, const std::string& text);
 /// byte, or a 32-bit number in decimal or 0x hexadecimal.
 long long ParseCodecTag(const std::string& option, const std::string& text);
 
-/// A channel layout by name (see ChannelLayoutNames) or as a non-zero 32-bit speaker mask in
-/// decimal or 0x hexadecimal.
+/// A channel layout as libavutil reads it: FFmpeg's names in any case ("5.1(side)", "Stereo"),
+/// speaker lists ("FL+FR+LFE") and non-zero 32-bit speaker masks ("0x3f", "4").
 Tarvek::Conf::ChannelLayout ParseChannelLayout(const std::string& option, const std::string& text);
-/// The layout names ParseChannelLayout takes, in the order of their channel count.
+/// libavutil's standard layouts that fit the 32-bit mask, by their FFmpeg names, in its order.
 const std::vector<std::pair<std::string, Tarvek::Conf::ChannelLayout>>& ChannelLayoutNames();
 
 /// A pixel format by libavutil's name ("yuv420p"), in any letter case.

@@ -1,6 +1,8 @@
 // formatdesc's output. Text goes to standard output because PrintContent writes there.
 #include "Output.h"
 
+#include <Tarvek/FFmpeg/Names.h>
+
 #include <algorithm>
 #include <bitset>
 #include <cstdio>
@@ -25,6 +27,7 @@ using Tarvek::Conf::IFormatCodecVideo;
 
 // The values a reader cannot see at a glance in the property tree, when their settings are set.
 struct Derived {
+  std::optional<std::string> tag;
   std::optional<Pair> frameAspect;
   std::optional<Pair> frameRate;
   std::optional<std::string> pixelFormat;
@@ -37,13 +40,9 @@ std::string RatioText(Pair ratio, char separator) {
   return std::to_string(ratio.first) + separator + std::to_string(ratio.second);
 }
 
+// FFmpeg's name of a layout; a mask without one as libavutil lists its speakers.
 std::string LayoutName(Tarvek::Conf::ChannelLayout layout) {
-  for (const auto& [name, value] : ChannelLayoutNames()) {
-    if (value == layout) return name;
-  }
-  char hex[16];
-  std::snprintf(hex, sizeof hex, "0x%x", static_cast<unsigned int>(layout));
-  return hex;
+  return Tarvek::FFmpeg::ChannelLayoutName(layout);
 }
 
 // libavutil's name of a format, or its number when libavutil has none.
@@ -78,6 +77,10 @@ void DeriveAudio(const IFormatCodecAudio& audio, Derived& derived) {
 
 Derived Derive(const IFormatCodec& codec) {
   Derived derived;
+  if (codec.ExistsCodecTag()) {
+    const std::string text = Tarvek::FFmpeg::FourccText(codec.GetCodecTag());
+    if (!text.empty()) derived.tag = text;
+  }
   if (const auto* video = dynamic_cast<const IFormatCodecVideo*>(&codec)) {
     DeriveVideo(*video, derived);
   }
@@ -90,6 +93,7 @@ Derived Derive(const IFormatCodec& codec) {
 std::vector<std::pair<std::string, std::string>> SummaryLines(
     const Derived& derived, const std::optional<Bitrates>& bitrates) {
   std::vector<std::pair<std::string, std::string>> lines;
+  if (derived.tag) lines.emplace_back("Codec tag", *derived.tag);
   if (derived.frameAspect) lines.emplace_back("Frame aspect", RatioText(*derived.frameAspect, ':'));
   if (derived.frameRate) {
     const Pair rate = *derived.frameRate;
@@ -229,6 +233,7 @@ nlohmann::ordered_json DescriptionJson(const boost::intrusive_ptr<IFormatCodec>&
   nlohmann::ordered_json json = nlohmann::ordered_json::parse(Tarvek::Conf::ToJson(codec));
   json["settings"] = SettingsJson(codec->GetProperty());
   const Derived derived = Derive(*codec);
+  if (derived.tag) json["codec_tag_name"] = *derived.tag;
   if (derived.frameAspect) json["frame_aspect"] = RatioText(*derived.frameAspect, ':');
   if (derived.frameRate) {
     const Pair rate = *derived.frameRate;

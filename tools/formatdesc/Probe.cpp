@@ -1,5 +1,5 @@
-// formatdesc probe: a media file's streams as descriptions, through the library's public
-// interfaces only, with a verdict on each bitrate.
+// formatdesc probe: a media file's streams as the FFmpeg bridge describes them, with a verdict on
+// each bitrate.
 #include "Probe.h"
 
 #include "Output.h"
@@ -9,9 +9,12 @@ extern "C" {
 #include <libavformat/avformat.h>
 #include <libavutil/channel_layout.h>
 #include <libavutil/log.h>
-#include <libavutil/rational.h>
 }
 
+#include <Tarvek/FFmpeg/Names.h>
+#include <Tarvek/FFmpeg/Streams.h>
+
+#include <unistd.h>
 #include <boost/exception/get_error_info.hpp>
 #include <cmath>
 #include <cstdarg>
@@ -29,11 +32,7 @@ using Tarvek::Conf::IFormatCodec;
 using Tarvek::Conf::IFormatCodecAudio;
 using Tarvek::Conf::IFormatCodecSubtitle;
 using Tarvek::Conf::IFormatCodecVideo;
-
-// The bitrate functions read a video description's quality only in vbr mode. A file holds no
-// encoder quality figure, so the range is asked for in a target-bitrate mode, on a copy: the
-// description itself keeps only what the file says.
-const char kTargetBitrateMode[] = "cbr";
+namespace Bridge = Tarvek::FFmpeg;
 
 // A setting the bitrates read, as a sentence names it.
 std::string SettingPhrase(const std::string& key) {
@@ -51,210 +50,68 @@ std::string SettingPhrase(const std::string& key) {
   return found == phrases.end() ? key : found->second;
 }
 
-// The value of metadata entry `key` of the stream, or null.
-const char* Metadata(const AVStream& stream, const char* key) {
-  const AVDictionaryEntry* entry = av_dict_get(stream.metadata, key, nullptr, 0);
-  return entry != nullptr && entry->value != nullptr && entry->value[0] != '\0' ? entry->value
-                                                                                : nullptr;
-}
-
-// The codec's extradata as the description's private data, when there is any.
-void SetExtradata(IFormatCodec& codec, const AVCodecParameters& parameters) {
-  if (parameters.extradata != nullptr && parameters.extradata_size > 0) {
-    codec.SetPrivateData(Tarvek::CreateBlob(parameters.extradata,
-                                            static_cast<std::size_t>(parameters.extradata_size)));
-  }
-}
-
-// The settings every kind takes from the codec parameters: identifier (with libavcodec's long
-// name of the codec, where a new description would say "Unknown codec"), tag and bitrate.
-void SetCodec(IFormatCodec& codec, const AVCodecParameters& parameters, bool withBitrate) {
-  codec.SetCodecID(avcodec_get_name(parameters.codec_id));
-  const AVCodecDescriptor* descriptor = avcodec_descriptor_get(parameters.codec_id);
-  if (descriptor != nullptr && descriptor->long_name != nullptr) {
-    codec.SetCodecName(descriptor->long_name);
-  }
-  if (parameters.codec_tag != 0) codec.SetCodecTag(parameters.codec_tag);
-  if (withBitrate && parameters.bit_rate > 0) codec.SetBitrate(parameters.bit_rate);
-}
-
-// The stream's pixel aspect, as libavformat guesses it: the container's when it gives one, else
-// the codec's; 0:1 when neither does.
-AVRational PixelAspect(const AVStream& stream) {
-  for (const AVRational aspect :
-       {stream.sample_aspect_ratio, stream.codecpar->sample_aspect_ratio}) {
-    if (aspect.num > 0 && aspect.den > 0) {
-      AVRational reduced{0, 1};
-      av_reduce(&reduced.num, &reduced.den, aspect.num, aspect.den,
-                std::numeric_limits<int>::max());
-      return reduced;
-    }
-  }
-  return AVRational{0, 1};
-}
-
-// `video` without its pixel aspect: the size is set only together with one, so an unknown aspect
-// is stored as 1:1 and then taken out of the tree again.
-void DropPixelAspect(IFormatCodecVideo& video) {
-  const Tarvek::Core::Property& tree = video.GetProperty();
-  Tarvek::Core::Property kept(tree.GetName());
-  for (const Tarvek::Core::Property& child : tree.GetChildren()) {
-    if (child.GetName() != IFormatCodecVideo::TAG_ASPECTX &&
-        child.GetName() != IFormatCodecVideo::TAG_ASPECTY) {
-      kept.SetChild(child.GetName(), child);
-    }
-  }
-  video.SetProperty(kept);
-}
-
-void DescribeVideo(const AVStream& stream, StreamReport& report) {
-  const AVCodecParameters& parameters = *stream.codecpar;
-  if (parameters.width <= 0 || parameters.height <= 0) {
-    report.damage = "the frame size is unknown (libavformat could read no picture of it)";
-    return;
-  }
-  auto video = Tarvek::Conf::FormatCodecVideo::Create();
-  SetCodec(*video, parameters, true);
-  const auto width = static_cast<unsigned int>(parameters.width);
-  const auto height = static_cast<unsigned int>(parameters.height);
-  const AVRational aspect = PixelAspect(stream);
-  if (aspect.num > 0) {
-    video->InitByPixelAspect(width, height, static_cast<unsigned int>(aspect.num),
-                             static_cast<unsigned int>(aspect.den));
-  } else {
-    video->InitByPixelAspect(width, height, 1, 1);
-    DropPixelAspect(*video);
-    report.notes.push_back("the pixel aspect is unknown (0:1), so it is left unset");
-  }
-  const AVRational rate = stream.avg_frame_rate;
-  if (rate.num > 0 && rate.den > 0) {
-    video->SetFrameRate(static_cast<unsigned int>(rate.num), static_cast<unsigned int>(rate.den));
-  } else {
-    report.notes.push_back("the average frame rate is unknown, so it is left unset");
-  }
-  if (parameters.format >= 0 && parameters.format < AV_PIX_FMT_NB) {
-    video->SetPixelFormat(static_cast<AVPixelFormat>(parameters.format));
-  } else {
-    report.notes.push_back("the pixel format is unknown, so it is left unset");
-  }
-  SetExtradata(*video, parameters);
-  report.description = video;
-}
-
 // `count` channels, or "1 channel".
 std::string Channels(int count) {
   return std::to_string(count) + (count == 1 ? " channel" : " channels");
 }
 
-// The speaker mask of a layout in libavutil's native order that the library's 32-bit layout can
-// hold; otherwise a note saying why the layout is left unset.
-std::optional<Tarvek::Conf::ChannelLayout> SpeakerMask(const AVChannelLayout& layout,
-                                                       std::vector<std::string>& notes) {
-  if (layout.order != AV_CHANNEL_ORDER_NATIVE) {
-    notes.push_back("the file gives " + Channels(layout.nb_channels) + " in no speaker order (" +
-                    (layout.order == AV_CHANNEL_ORDER_UNSPEC ? "unspecified" : "a custom one") +
-                    "), so the channel layout is left unset");
-    return std::nullopt;
+// Why a stream the probe describes cannot be described; empty when it can.
+std::string Damage(const AVCodecParameters& parameters) {
+  if (parameters.codec_id == AV_CODEC_ID_NONE)
+    return "libavformat does not know the stream's codec";
+  if (parameters.codec_type == AVMEDIA_TYPE_VIDEO &&
+      (parameters.width <= 0 || parameters.height <= 0)) {
+    return "the frame size is unknown (libavformat could read no picture of it)";
   }
-  if (layout.u.mask > std::numeric_limits<std::uint32_t>::max()) {
-    char hex[32];
-    std::snprintf(hex, sizeof hex, "0x%llx", static_cast<unsigned long long>(layout.u.mask));
-    notes.push_back(std::string("the speaker mask ") + hex +
-                    " names speakers beyond the library's 32, so the channel layout is left unset");
-    return std::nullopt;
+  if (parameters.codec_type == AVMEDIA_TYPE_AUDIO) {
+    if (parameters.sample_rate <= 0) {
+      return "the sample rate is unknown (libavformat could read no sample of it)";
+    }
+    if (parameters.ch_layout.nb_channels <= 0) {
+      return "the channel count is unknown (libavformat could read no sample of it)";
+    }
   }
-  return static_cast<Tarvek::Conf::ChannelLayout>(layout.u.mask);
+  return std::string();
 }
 
-// For an audio description without a layout, a copy with libavutil's usual layout for the
-// stream's channel count, and a note saying so: the presets' figures depend on the count. The
-// description itself when it has a layout, or null when there is no usual layout to take.
-boost::intrusive_ptr<const IFormatCodec> WithUsualLayout(const IFormatCodecAudio& audio,
-                                                         int channels,
-                                                         std::vector<std::string>& notes) {
-  if (audio.ExistsChannelLayout()) return &audio;
+// For an audio description without a layout, the note that the range is that of libavutil's
+// usual layout for the stream's channel count, which the range functions take.
+void NoteUsualLayout(const IFormatCodecAudio& audio, int channels,
+                     std::vector<std::string>& notes) {
+  if (audio.ExistsChannelLayout() || channels <= 0) return;
   AVChannelLayout usual{};
   av_channel_layout_default(&usual, channels);
-  if (usual.order != AV_CHANNEL_ORDER_NATIVE || usual.u.mask == 0 ||
-      usual.u.mask > std::numeric_limits<std::uint32_t>::max()) {
-    return nullptr;
+  if (usual.order == AV_CHANNEL_ORDER_NATIVE && usual.u.mask != 0 &&
+      usual.u.mask <= std::numeric_limits<std::uint32_t>::max()) {
+    notes.push_back("the range is that of " + Channels(channels) + " in the usual layout (" +
+                    Bridge::ChannelLayoutName(usual.u.mask) + ")");
   }
-  char name[64] = {};
-  av_channel_layout_describe(&usual, name, sizeof name);
-  auto copy = audio.Clone();
-  copy->SetChannelLayout(static_cast<Tarvek::Conf::ChannelLayout>(usual.u.mask));
-  notes.push_back("the range is that of " + Channels(channels) + " in the usual layout (" + name +
-                  ")");
-  return copy;
-}
-
-void DescribeAudio(const AVStream& stream, StreamReport& report) {
-  const AVCodecParameters& parameters = *stream.codecpar;
-  if (parameters.sample_rate <= 0) {
-    report.damage = "the sample rate is unknown (libavformat could read no sample of it)";
-    return;
-  }
-  if (parameters.ch_layout.nb_channels <= 0) {
-    report.damage = "the channel count is unknown (libavformat could read no sample of it)";
-    return;
-  }
-  auto audio = Tarvek::Conf::FormatCodecAudio::Create();
-  SetCodec(*audio, parameters, true);
-  audio->SetSampleRate(parameters.sample_rate);
-  if (const auto mask = SpeakerMask(parameters.ch_layout, report.notes)) {
-    audio->SetChannelLayout(*mask);
-  }
-  if (parameters.frame_size > 0) audio->SetFrameSize(parameters.frame_size);
-  if (parameters.format >= 0 && parameters.format < AV_SAMPLE_FMT_NB) {
-    audio->SetSampleFormat(static_cast<AVSampleFormat>(parameters.format));
-  } else {
-    report.notes.push_back("the sample format is unknown, so it is left unset");
-  }
-  if (const char* language = Metadata(stream, "language")) audio->SetLanguage(language);
-  SetExtradata(*audio, parameters);
-  report.description = audio;
-}
-
-void DescribeSubtitle(const AVStream& stream, StreamReport& report) {
-  const AVCodecParameters& parameters = *stream.codecpar;
-  auto subtitle = Tarvek::Conf::FormatCodecSubtitle::Create();
-  SetCodec(*subtitle, parameters, false);
-  if (const char* language = Metadata(stream, "language")) subtitle->SetLanguage(language);
-  if (const char* title = Metadata(stream, "title")) subtitle->SetTitle(title);
-  // Styled subtitles keep their header (script info and styles) as the codec's extradata: it is
-  // both the header text and, like every stream's extradata, the private data.
-  const bool styled =
-      parameters.codec_id == AV_CODEC_ID_ASS || parameters.codec_id == AV_CODEC_ID_SSA;
-  if (styled && parameters.extradata != nullptr && parameters.extradata_size > 0) {
-    const char* text = reinterpret_cast<const char*>(parameters.extradata);
-    const auto size = static_cast<std::size_t>(parameters.extradata_size);
-    subtitle->SetSubtitleHeader(std::string(text, strnlen(text, size)));
-  }
-  if (parameters.codec_id == AV_CODEC_ID_DVB_SUBTITLE && parameters.width > 0 &&
-      parameters.height > 0) {
-    subtitle->SetDVBWidth(static_cast<unsigned int>(parameters.width));
-    subtitle->SetDVBHeight(static_cast<unsigned int>(parameters.height));
-  }
-  SetExtradata(*subtitle, parameters);
-  report.description = subtitle;
 }
 
 // The presets' range for the description and the verdict on its bitrate, or why there is none.
+// Compressed lossless codecs get their compression instead of a verdict.
 void Judge(StreamReport& report, const AVCodecParameters& parameters) {
+  const IFormatCodec& codec = *report.description;
+  const bool lossless = Bridge::IsCompressedLossless(codec.GetCodecID());
+  if (lossless && codec.ExistsBitrate()) {
+    if (const long long uncompressed = Bridge::UncompressedBitrate(codec)) {
+      report.uncompressed = uncompressed;
+    }
+  }
+  const int channels = parameters.ch_layout.nb_channels;
   try {
-    if (const auto video = boost::dynamic_pointer_cast<IFormatCodecVideo>(report.description)) {
-      auto copy = video->Clone();
-      copy->SetBitrateMode(kTargetBitrateMode);
-      report.range = VideoBitrates(copy);
-    } else if (const auto audio =
-                   boost::dynamic_pointer_cast<IFormatCodecAudio>(report.description)) {
-      const auto judged = WithUsualLayout(*audio, parameters.ch_layout.nb_channels, report.notes);
-      report.range = AudioBitrates(judged != nullptr ? judged : audio);
-    } else {
+    if (dynamic_cast<const IFormatCodecVideo*>(&codec) == nullptr &&
+        dynamic_cast<const IFormatCodecAudio*>(&codec) == nullptr) {
       return;
     }
+    const Bridge::PresetBitrates range = Bridge::PresetRange(codec, channels);
+    report.range = Bitrates{range.typical, range.minimum, range.maximum};
+    if (const auto* audio = dynamic_cast<const IFormatCodecAudio*>(&codec)) {
+      NoteUsualLayout(*audio, channels, report.notes);
+    }
   } catch (const Tarvek::Conf::UnknownCodecError&) {
-    report.noVerdict = "no preset for codec " + report.description->GetCodecID();
+    if (!report.uncompressed)
+      report.noVerdict = "no preset for codec " + Bridge::PresetCodecID(codec);
     return;
   } catch (const Tarvek::Core::ChildNotFound& e) {
     const std::string* key = boost::get_error_info<Tarvek::Core::ChildNotFound::ChildNameInfo>(e);
@@ -266,11 +123,17 @@ void Judge(StreamReport& report, const AVCodecParameters& parameters) {
     report.noVerdict = "none (the presets refuse the description: " + LibraryDescription(e) + ")";
     return;
   }
-  if (!report.description->ExistsBitrate()) {
+  if (!codec.ExistsBitrate()) {
     report.noVerdict = "none (the file gives no bitrate for this stream)";
     return;
   }
-  report.verdict = JudgeBitrate(report.description->GetBitrate(), *report.range);
+  if (lossless) {
+    if (!report.uncompressed) {
+      report.noVerdict = "none (a lossless codec; the uncompressed rate is unknown)";
+    }
+    return;
+  }
+  report.verdict = JudgeBitrate(codec.GetBitrate(), *report.range);
 }
 
 // Keeps libavformat's messages off the terminal while it lives, and remembers the last error
@@ -326,24 +189,102 @@ std::string Heading(const StreamReport& stream) {
   return heading;
 }
 
-// What the summary adds to a probed description: the verdict, then the notes.
+// "lossless, compressed to 58% of the uncompressed 1.41 Mb/s (1.72:1)".
+std::string LosslessText(long long bitrate, long long uncompressed) {
+  char text[96];
+  std::snprintf(text, sizeof text, "lossless, compressed to %.0f%% of the uncompressed ",
+                100.0 * static_cast<double>(bitrate) / static_cast<double>(uncompressed));
+  char ratio[32];
+  std::snprintf(ratio, sizeof ratio, " (%.2f:1)",
+                static_cast<double>(uncompressed) / static_cast<double>(bitrate));
+  return text + ReadableBitrate(uncompressed) + ratio;
+}
+
+// Where the bitrate came from, as a sentence names it.
+std::string SourcePhrase(const std::string& source) {
+  if (source == "statistics_tag") return "the container's statistics tag (BPS)";
+  if (source == "container") return "the container's total (the file's only stream)";
+  if (source == "packets") return "measured from the packets";
+  return "the stream";
+}
+
+// The displayed aspect of a picture turned by a quarter: the frame aspect the other way round.
+std::optional<std::string> DisplayedAspect(const IFormatCodec& codec) {
+  const auto* video = dynamic_cast<const IFormatCodecVideo*>(&codec);
+  const Tarvek::Core::Property& metadata = codec.GetMetadata();
+  const auto rotation = metadata.FindChild(Bridge::Keys::kRotation);
+  if (video == nullptr || rotation == metadata.GetChildren().end() ||
+      rotation->GetType() != Tarvek::PropertyTypeInt64 || !video->ExistsWidth() ||
+      !video->ExistsHeight() || !video->ExistsPixelAspectX() || !video->ExistsPixelAspectY()) {
+    return std::nullopt;
+  }
+  const long long degrees = rotation->GetInt64();
+  if (degrees % 180 == 0 || degrees % 90 != 0) return std::nullopt;
+  return std::to_string(video->GetFrameAspectY()) + ":" + std::to_string(video->GetFrameAspectX()) +
+         " (turned by " + std::to_string(degrees) + " degrees)";
+}
+
+// libavcodec's name of the description's profile, when it has one.
+std::optional<std::string> ProfileName(const IFormatCodec& codec) {
+  const Tarvek::Core::Property& metadata = codec.GetMetadata();
+  const auto profile = metadata.FindChild(Bridge::Keys::kProfile);
+  const AVCodecDescriptor* descriptor =
+      codec.ExistsCodecID() ? avcodec_descriptor_get_by_name(codec.GetCodecID().c_str()) : nullptr;
+  if (descriptor == nullptr || profile == metadata.GetChildren().end() ||
+      profile->GetType() != Tarvek::PropertyTypeInt64) {
+    return std::nullopt;
+  }
+  const char* name = avcodec_profile_name(descriptor->id, static_cast<int>(profile->GetInt64()));
+  if (name == nullptr) return std::nullopt;
+  return std::string(name);
+}
+
+// What the summary adds to a probed description: profile, displayed aspect, the verdict and
+// where the bitrate came from, then the notes.
 std::vector<std::pair<std::string, std::string>> ProbeLines(const StreamReport& stream) {
   std::vector<std::pair<std::string, std::string>> lines;
+  if (const auto profile = ProfileName(*stream.description))
+    lines.emplace_back("Profile", *profile);
+  if (const auto displayed = DisplayedAspect(*stream.description)) {
+    lines.emplace_back("Displayed aspect", *displayed);
+  }
   if (stream.verdict) lines.emplace_back("Bitrate verdict", VerdictText(*stream.verdict));
+  if (stream.uncompressed) {
+    lines.emplace_back("Bitrate verdict",
+                       LosslessText(stream.description->GetBitrate(), *stream.uncompressed));
+  }
   if (!stream.noVerdict.empty()) lines.emplace_back("Bitrate verdict", stream.noVerdict);
+  if (!stream.bitrateSource.empty()) {
+    lines.emplace_back("Bitrate source", SourcePhrase(stream.bitrateSource));
+  }
   for (const std::string& note : stream.notes) lines.emplace_back("Note", note);
   return lines;
 }
 
 nlohmann::ordered_json VerdictJson(const StreamReport& stream) {
-  if (!stream.verdict) return {{"result", "none"}, {"text", stream.noVerdict}};
-  const Verdict& verdict = *stream.verdict;
-  return {{"result", PlacementName(verdict.placement)},
-          {"text", VerdictText(verdict)},
-          {"bitrate", verdict.bitrate},
-          {"bound", verdict.bound},
-          {"difference", verdict.difference},
-          {"percent", std::round(verdict.percent * 100.0) / 100.0}};
+  nlohmann::ordered_json json;
+  if (stream.uncompressed) {
+    const long long bitrate = stream.description->GetBitrate();
+    json = {{"result", "lossless"},
+            {"text", LosslessText(bitrate, *stream.uncompressed)},
+            {"bitrate", bitrate},
+            {"uncompressed", *stream.uncompressed},
+            {"ratio", std::round(static_cast<double>(*stream.uncompressed) /
+                                 static_cast<double>(bitrate) * 100.0) /
+                          100.0}};
+  } else if (!stream.verdict) {
+    json = {{"result", "none"}, {"text", stream.noVerdict}};
+  } else {
+    const Verdict& verdict = *stream.verdict;
+    json = {{"result", PlacementName(verdict.placement)},
+            {"text", VerdictText(verdict)},
+            {"bitrate", verdict.bitrate},
+            {"bound", verdict.bound},
+            {"difference", verdict.difference},
+            {"percent", std::round(verdict.percent * 100.0) / 100.0}};
+  }
+  if (!stream.bitrateSource.empty()) json["bitrate_source"] = stream.bitrateSource;
+  return json;
 }
 
 nlohmann::ordered_json StreamJson(const StreamReport& stream) {
@@ -357,7 +298,9 @@ nlohmann::ordered_json StreamJson(const StreamReport& stream) {
   if (stream.description) {
     json["notes"] = stream.notes;
     json["description"] = DescriptionJson(stream.description, stream.range);
-    if (stream.verdict || !stream.noVerdict.empty()) json["verdict"] = VerdictJson(stream);
+    if (stream.verdict || stream.uncompressed || !stream.noVerdict.empty()) {
+      json["verdict"] = VerdictJson(stream);
+    }
   }
   return json;
 }
@@ -414,8 +357,10 @@ std::string VerdictText(const Verdict& verdict) {
          ReadableBitrate(verdict.bound) + ")";
 }
 
-StreamReport DescribeStream(const AVStream& stream) {
+StreamReport DescribeStream(const AVFormatContext& context, unsigned int index,
+                            long long measured) {
   StreamReport report;
+  const AVStream& stream = *context.streams[index];
   report.index = stream.index;
   const AVCodecParameters& parameters = *stream.codecpar;
   const char* kind = av_get_media_type_string(parameters.codec_type);
@@ -425,27 +370,31 @@ StreamReport DescribeStream(const AVStream& stream) {
   if (type != AVMEDIA_TYPE_VIDEO && type != AVMEDIA_TYPE_AUDIO && type != AVMEDIA_TYPE_SUBTITLE) {
     return report;
   }
-  if (parameters.codec_id == AV_CODEC_ID_NONE) {
-    report.damage = "libavformat does not know the stream's codec";
-    return report;
-  }
+  report.damage = Damage(parameters);
+  if (!report.damage.empty()) return report;
   try {
-    if (type == AVMEDIA_TYPE_VIDEO) DescribeVideo(stream, report);
-    if (type == AVMEDIA_TYPE_AUDIO) DescribeAudio(stream, report);
-    if (type == AVMEDIA_TYPE_SUBTITLE) DescribeSubtitle(stream, report);
-    if (report.description) Judge(report, parameters);
+    Bridge::StreamDescription described = Bridge::DescribeStream(context, index);
+    report.description = std::move(described.description);
+    report.notes = std::move(described.notes);
+    if (type != AVMEDIA_TYPE_SUBTITLE &&
+        Bridge::SetMeasuredBitrate(*report.description, measured)) {
+      report.notes.push_back("the bitrate is measured from the stream's packets");
+    }
+    report.bitrateSource = Bridge::BitrateSourceName(Bridge::GetBitrateSource(*report.description));
+    Judge(report, parameters);
   } catch (const Tarvek::Exception& e) {
     // Nothing a file holds should make the library refuse; if it does, the stream is reported.
     report.description = nullptr;
     report.range.reset();
     report.verdict.reset();
+    report.uncompressed.reset();
     report.noVerdict.clear();
     report.damage = "the library refused its description: " + LibraryDescription(e);
   }
   return report;
 }
 
-FileReport ProbeFile(const std::string& path) {
+FileReport ProbeFile(const std::string& path, bool measure) {
   const QuietLog quiet;
   // The file protocol alone: a name such as "http://..." or "concat:..." is a file name here.
   AVDictionary* options = nullptr;
@@ -473,11 +422,27 @@ FileReport ProbeFile(const std::string& path) {
     throw UsageError("'" + path + "' holds no media streams" +
                      (found < 0 ? ": " + Reason(found) : std::string()));
   }
+  std::vector<long long> measured(input->nb_streams, 0);
+  if (measure) {
+    // A bar on a terminal only; a file read in a blink shows none.
+    const bool bar = isatty(STDERR_FILENO) != 0;
+    int shown = -1;
+    measured = Bridge::MeasureBitrates(*input, [&](double share) {
+      const int percent = static_cast<int>(share * 100.0);
+      if (!bar || percent == shown) return;
+      shown = percent;
+      const int filled = percent / 5;
+      std::cerr << "\rMeasuring [" << std::string(static_cast<std::size_t>(filled), '#')
+                << std::string(static_cast<std::size_t>(20 - filled), ' ') << "] " << percent << "%"
+                << std::flush;
+    });
+    if (bar && shown >= 0) std::cerr << "\r" << std::string(40, ' ') << "\r" << std::flush;
+  }
   FileReport report;
   report.container =
       input->iformat->long_name != nullptr ? input->iformat->long_name : input->iformat->name;
   for (unsigned int i = 0; i < input->nb_streams; ++i) {
-    report.streams.push_back(DescribeStream(*input->streams[i]));
+    report.streams.push_back(DescribeStream(*input, i, measured[i]));
   }
   return report;
 }

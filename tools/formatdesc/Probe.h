@@ -1,6 +1,7 @@
-// formatdesc probe: the streams of a media file, read with libavformat, as descriptions built
-// through the library's public interfaces, and a verdict on each stream's bitrate against the
-// range the presets give for it. Only the tool links libavformat; the library never sees it.
+// formatdesc probe: the streams of a media file, read with libavformat and described by the FFmpeg
+// bridge library, and a verdict on each stream's bitrate against the range the presets give for
+// it. This file keeps the presentation: which streams count as damaged, the verdicts, the text
+// and the JSON.
 #ifndef TARVEK_TOOLS_FORMATDESC_PROBE_H_
 #define TARVEK_TOOLS_FORMATDESC_PROBE_H_
 
@@ -14,7 +15,7 @@
 
 #include "Describe.h"
 
-struct AVStream;
+struct AVFormatContext;
 
 namespace Formatdesc {
 
@@ -62,8 +63,14 @@ struct StreamReport {
   std::vector<std::string> notes;
   /// The presets' bitrates for a video or audio description, when they have them.
   std::optional<Bitrates> range;
-  /// The stream's own bitrate against `range`, when both are known.
+  /// The stream's own bitrate against `range`, when both are known and the codec is lossy or PCM.
   std::optional<Verdict> verdict;
+  /// For a compressed lossless codec (flac, alac, ffv1, png ...) with a bitrate, instead of a
+  /// verdict: the uncompressed bitrate of the same samples or pixels, when it is known.
+  std::optional<long long> uncompressed;
+  /// Where the bitrate came from ("stream", "statistics_tag", "container", "packets"); empty
+  /// without one.
+  std::string bitrateSource;
   /// Instead of a verdict, "no preset for codec X", or "none (...)" saying why: a setting the
   /// presets need that the file does not give, their refusal, or no bitrate in the file. Empty
   /// for other kinds.
@@ -72,13 +79,13 @@ struct StreamReport {
   bool Skipped() const { return description == nullptr && damage.empty(); }
 };
 
-/// The report of `stream`: for video, audio and subtitle streams the description (codec
-/// identifier, tag, bitrate, geometry or sample layout, language, title, header, DVB size, and
-/// the codec's extradata as private data), the notes, and for video and audio the range and the
-/// verdict. Values the stream leaves unknown (a zero size or rate, a 0:1 pixel aspect, a channel
-/// order that is not a speaker mask) stay unset; a stream without a size, sample rate, channel
-/// count or known codec is damaged. Throws only std::bad_alloc.
-StreamReport DescribeStream(const AVStream& stream);
+/// The report of stream `index` of `context`: for video, audio and subtitle streams the FFmpeg
+/// bridge's description and notes, with `measured` (bit/s) as its bitrate when the file states
+/// none and it is positive, and for video and audio the range and the verdict (or, for a
+/// lossless codec, the compression against the uncompressed rate). A stream without a size,
+/// sample rate, channel count or known codec is damaged. Throws only std::bad_alloc.
+StreamReport DescribeStream(const AVFormatContext& context, unsigned int index,
+                            long long measured = 0);
 
 /// What the probe made of a file.
 struct FileReport {
@@ -88,11 +95,12 @@ struct FileReport {
 };
 
 /// Opens the file at `path` (a local file, never a network address or another protocol) and
-/// reports every stream. Throws UsageError, with libavformat's reason, for a file that cannot be
-/// opened or read, that libavformat does not recognise as media, or that holds no stream. A
-/// damaged stream is reported, not thrown. libavformat's own messages are kept off the
-/// terminal while it runs.
-FileReport ProbeFile(const std::string& path);
+/// reports every stream; with `measure`, reads every packet first to measure the bitrate of
+/// streams for which the file states none (with a progress bar on a terminal). Throws UsageError,
+/// with libavformat's reason, for a file that cannot be opened or read, that libavformat does not
+/// recognise as media, or that holds no stream. A damaged stream is reported, not thrown.
+/// libavformat's own messages are kept off the terminal while it runs.
+FileReport ProbeFile(const std::string& path, bool measure = false);
 
 /// Prints a line naming `path`, its container and its stream count, then each stream of
 /// `report` (only stream `only` when given): a heading line "Stream N: kind (codec)", then the
@@ -104,7 +112,7 @@ void PrintProbe(const std::string& path, const FileReport& report, std::optional
 /// "kind", "codec", "status" ("described", "damaged" or "skipped") and, as they apply,
 /// "damage", "notes", "description" (in the library's JSON form, with the derived values and
 /// the presets' bitrates, as --json gives for one description) and "verdict" ("result" below,
-/// within, above or none, and "text").
+/// within, above, lossless or none, "text", and "bitrate_source").
 nlohmann::ordered_json ProbeJson(const std::string& path, const FileReport& report,
                                  std::optional<int> only);
 

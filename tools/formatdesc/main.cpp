@@ -71,6 +71,7 @@ struct ProbeArgs {
   std::string file;
   std::optional<std::string> stream;
   bool json = false;
+  bool measure = false;
 };
 
 struct CodecsArgs {
@@ -262,13 +263,20 @@ void AddProbe(CLI::App& app, ProbeArgs& args) {
       ->type_name("FILE");
   AddText(*probe, "--stream", args.stream, "Only the stream of this index (0 is the first)", "N");
   probe->add_flag("--json", args.json, "Print one JSON object instead of text");
+  probe->add_flag("--measure", args.measure,
+                  "Read every packet to measure the bitrate of streams the file states none for");
   probe->footer(
       "Builds a description of every video, audio and subtitle stream from what the file says,\n"
       "and lists streams of other kinds as skipped. A value the file leaves unknown, such as a\n"
       "0:1 pixel aspect, stays unset, with a note. For video and audio it gives the presets'\n"
       "range (video in a target-bitrate mode, as a file holds no quality figure) and whether the\n"
       "stream's bitrate is below, within or above it and by how much; 'no preset for codec X'\n"
-      "when the presets do not know the codec, or why there is no verdict.\n"
+      "when the presets do not know the codec, or why there is no verdict. A lossless codec "
+      "(flac,\n"
+      "alac, ffv1, png) gets its compression against the uncompressed rate instead. The bitrate\n"
+      "is the stream's, else the container's statistics tag (BPS), else the container's total\n"
+      "for a file of one stream; --measure counts the packets where the file states none. The\n"
+      "output says which. Layouts and tags are named as FFmpeg names them.\n"
       "Exit status: 0 on success, 1 when a stream shown is damaged (it is reported, the others\n"
       "are described), 2 for bad usage or a file that cannot be read or is not media.");
 }
@@ -421,7 +429,7 @@ bool RunProbe(const ProbeArgs& args) {
   if (args.stream) {
     only = ParseNonNegative("--stream", *args.stream, std::numeric_limits<int>::max());
   }
-  const FileReport report = ProbeFile(args.file);
+  const FileReport report = ProbeFile(args.file, args.measure);
   const auto count = static_cast<long long>(report.streams.size());
   if (only && *only >= count) {
     throw BadValue(
