@@ -41,6 +41,8 @@ inline constexpr char kTitle[] = "title";              ///< video and audio (sub
 inline constexpr char kLanguage[] = "language";        ///< video (audio: SetLanguage)
 inline constexpr char kDuration[] = "duration";        ///< integer, microseconds
 inline constexpr char kBitrateSource[] = "bitrate_source";  ///< see BitrateSourceName
+/// integer, audio whose channels have no speaker order the library can hold: their count
+inline constexpr char kChannels[] = "channels";
 }  // namespace Keys
 
 /// A stream's description and what could not go into it.

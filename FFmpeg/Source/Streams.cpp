@@ -198,12 +198,14 @@ void DescribeAudio(Builder& builder, const AVCodecParameters& parameters) {
     builder.Note("the channel layout (" + Channels(layout.nb_channels) +
                  ") is unknown or invalid, so it is left unset");
   } else if (layout.order != AV_CHANNEL_ORDER_NATIVE) {
+    builder.SetInteger(Keys::kChannels, layout.nb_channels);
     builder.Note("the file gives " + Channels(layout.nb_channels) + " in no speaker order (" +
                  (layout.order == AV_CHANNEL_ORDER_UNSPEC ? "unspecified" : "a custom one") +
                  "), so the channel layout is left unset");
   } else if (layout.u.mask > std::numeric_limits<std::uint32_t>::max()) {
     char hex[32];
     std::snprintf(hex, sizeof hex, "0x%llx", static_cast<unsigned long long>(layout.u.mask));
+    builder.SetInteger(Keys::kChannels, layout.nb_channels);
     builder.Note(std::string("the speaker mask ") + hex +
                  " names speakers beyond the library's 32, so the channel layout is left unset");
   } else {
@@ -583,6 +585,11 @@ std::vector<std::string> ToCodecParameters(const IFormatCodec& description,
     if (audio->ExistsChannelLayout()) {
       av_channel_layout_uninit(&parameters.ch_layout);
       av_channel_layout_from_mask(&parameters.ch_layout, audio->GetChannelLayout());
+    } else if (const auto channels = MetadataInt(metadata, Keys::kChannels);
+               channels && *channels > 0) {
+      av_channel_layout_uninit(&parameters.ch_layout);
+      parameters.ch_layout.order = AV_CHANNEL_ORDER_UNSPEC;
+      parameters.ch_layout.nb_channels = *channels;
     }
     if (audio->ExistsFrameSize()) parameters.frame_size = audio->GetFrameSize();
     if (audio->ExistsSampleFormat()) parameters.format = audio->GetSampleFormat();

@@ -11,7 +11,8 @@
 //     "!/json/pointer" (no such member: a setting left unset);
 //   FormatdescCheck probeback TOOL MEDIA...
 //     each description probe --json gives for the media files, stored in a file, is read back by
-//     the subcommand of its kind with --from-json: same kind, same tree, same private data;
+//     the subcommand of its kind with --from-json: same kind, same tree, same private data; and
+//     the whole document, read with --stream, gives the range the probe gave;
 //   FormatdescCheck survives TOOL FILE...
 //     probe reads damaged copies of each media file (cut short at seven points, and with bytes
 //     overwritten at eight places) without crashing: every run ends with status 0 or 1 and
@@ -195,6 +196,7 @@ int CheckProbeBack(const std::string& tool, const std::vector<std::string>& medi
   int described = 0;
   int failures = 0;
   const std::string file = "probeback-" + std::to_string(getpid()) + ".json";
+  const std::string whole = "probeback-whole-" + std::to_string(getpid()) + ".json";
   for (const std::string& path : media) {
     const Json probed =
         Json::parse(Capture(Quote(tool) + " probe " + Quote(path) + " --json"), nullptr, false);
@@ -225,9 +227,23 @@ int CheckProbeBack(const std::string& tool, const std::vector<std::string>& medi
                     << " differs when read back\n";
         }
       }
+      // The whole document read with --stream gives the range the probe gave (video in a
+      // target-bitrate mode, as the probe judges it).
+      if (!description.contains("bitrate")) continue;
+      std::ofstream(whole) << probed.dump();
+      const Json range =
+          Json::parse(Capture(Quote(tool) + ' ' + kind + " --from-json " + whole + " --stream " +
+                              std::to_string(stream.value("index", -1)) +
+                              (kind == "video" ? " --bitrate-mode cbr" : "") + " --json"),
+                      nullptr, false);
+      if (range.is_discarded() || range.value("bitrate", Json()) != description["bitrate"]) {
+        ++failures;
+        std::cerr << "FormatdescCheck: " << where << ": --from-json --stream gives another range\n";
+      }
     }
   }
   std::remove(file.c_str());
+  std::remove(whole.c_str());
   if (described == 0) return Fail("no stream was described");
   return failures == 0 ? 0 : Fail(std::to_string(failures) + " differences");
 }

@@ -3,6 +3,9 @@
 
 #include "Output.h"
 
+#include <Tarvek/FFmpeg/Names.h>
+#include <Tarvek/FFmpeg/Streams.h>
+
 #include <boost/exception/get_error_info.hpp>
 #include <cerrno>
 #include <cstdio>
@@ -263,15 +266,36 @@ boost::intrusive_ptr<IFormatCodecSubtitle> BuildSubtitle(const SubtitleArgs& arg
   return subtitle;
 }
 
+// The bitrates are those the probe judges a stream by, so that a description read back from
+// probe --json gets the same: the presets' codec that a profile in the metadata reaches
+// (prores with profile HQ: prores_hq) and, for audio whose channels have no speaker order, the
+// usual layout for their count.
 Bitrates VideoBitrates(const boost::intrusive_ptr<const IFormatCodec>& video) {
+  boost::intrusive_ptr<const IFormatCodec> judged = video;
+  const std::string preset = Tarvek::FFmpeg::PresetCodecID(*video);
+  if (!preset.empty() && video->ExistsCodecID() && preset != video->GetCodecID()) {
+    const auto copy = boost::dynamic_pointer_cast<const IFormatCodecVideo>(video)->Clone();
+    copy->SetCodecID(preset);
+    judged = copy;
+  }
   // Braces evaluate left to right: the default is asked first and reports a missing setting.
-  return Bitrates{Tarvek::Conf::GetDefaultVideoBitrate(video),
-                  Tarvek::Conf::GetMinVideoBitrate(video), Tarvek::Conf::GetMaxVideoBitrate(video)};
+  return Bitrates{Tarvek::Conf::GetDefaultVideoBitrate(judged),
+                  Tarvek::Conf::GetMinVideoBitrate(judged),
+                  Tarvek::Conf::GetMaxVideoBitrate(judged)};
 }
 
 Bitrates AudioBitrates(const boost::intrusive_ptr<const IFormatCodec>& audio) {
-  return Bitrates{Tarvek::Conf::GetDefaultAudioBitrate(audio),
-                  Tarvek::Conf::GetMinAudioBitrate(audio), Tarvek::Conf::GetMaxAudioBitrate(audio)};
+  if (dynamic_cast<const IFormatCodecAudio*>(audio.get()) == nullptr) {
+    Tarvek::Conf::GetDefaultAudioBitrate(audio);  // the library's error for another kind
+  }
+  const auto& metadata = audio->GetMetadata();
+  const auto channels = metadata.FindChild(Tarvek::FFmpeg::Keys::kChannels);
+  const bool counted = channels != metadata.GetChildren().end() &&
+                       channels->GetType() == Tarvek::PropertyTypeInt64 &&
+                       channels->GetInt64() > 0 && channels->GetInt64() <= 64;
+  const Tarvek::FFmpeg::PresetBitrates range =
+      Tarvek::FFmpeg::PresetRange(*audio, counted ? static_cast<int>(channels->GetInt64()) : 0);
+  return Bitrates{range.typical, range.minimum, range.maximum};
 }
 
 std::vector<std::string> MissingForBitrates(const IFormatCodec& codec) {
