@@ -64,7 +64,7 @@ std::string H264(IFormatCodec& description, Data data) {
                                ? ParseAvcByteStream(data.bytes, data.size)
                                : ParseAvcConfig(data.bytes, data.size);
   return std::string(SampleEntry(description, "avc1", "avc3")) +
-         Format(".%02X%02X%02X", config.profile, config.compatibility, config.level);
+         Format(".%02x%02x%02x", config.profile, config.compatibility, config.level);
 }
 
 std::string Hevc(IFormatCodec& description, Data data) {

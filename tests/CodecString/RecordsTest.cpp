@@ -60,7 +60,7 @@ TEST(CodecStringTest, StringsOfKnownRecords) {
   EXPECT_EQ(CodecString::GetCodecString(Audio("eac3", {})), "ec-3");
   // Parameter sets in an Annex B byte stream, the picture parameter set first.
   const Bytes annexB = {0, 0, 1, 0x68, 0xEE, 0, 0, 0, 1, 0x67, 0x4D, 0x40, 0x1F, 0xAB};
-  EXPECT_EQ(CodecString::GetCodecString(Video("h264", annexB)), "avc1.4D401F");
+  EXPECT_EQ(CodecString::GetCodecString(Video("h264", annexB)), "avc1.4d401f");
   // VP9 without a record: profile and depth from the pixel format, level from size and rate.
   auto vp9 = boost::dynamic_pointer_cast<Conf::IFormatCodecVideo>(Video("vp9", {}));
   vp9->InitByPixelAspect(1920, 1080, 1, 1);

@@ -434,6 +434,9 @@ void Write(const MediaFile& file, const std::string& path) {
   Check(avformat_alloc_output_context2(&raw, nullptr, nullptr, path.c_str()), path);
   Output output(raw);
   output->flags |= AVFMT_FLAG_BITEXACT;
+  // The DASH muxer's MP4 segments take FLAC only as an experimental feature.
+  if (std::strcmp(output->oformat->name, "dash") == 0)
+    output->strict_std_compliance = FF_COMPLIANCE_EXPERIMENTAL;
   std::vector<Track> tracks;
   for (const VideoStream& video : file.video) AddVideo(*output, video, tracks);
   for (const AudioStream& audio : file.audio) AddAudio(*output, audio, tracks);
