@@ -141,7 +141,9 @@ std::string Av1(Data data) {
 }
 
 std::string Aac(const std::string& codecId, Data data) {
-  if (data.size) return Format("mp4a.40.%u", ParseAacConfig(data.bytes, data.size).objectType);
+  if (data.size)
+    return Format("mp4a.40.%u",
+                  static_cast<unsigned>(ParseAacConfig(data.bytes, data.size).objectType));
   return codecId == "aac_he" ? "mp4a.40.5" : codecId == "aac_he_v2" ? "mp4a.40.29" : "mp4a.40.2";
 }
 
