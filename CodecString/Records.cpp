@@ -15,7 +15,8 @@ namespace {
                     AddStack(CodecStringError() << DescriptionInfo(what)));
 }
 
-// Bytes of one record, read front to back; every read is checked against what remains.
+// Bytes of one record, read front to back; every read is checked against what remains. Parts are
+// named by static texts (and an index for repeated parts), so reading allocates nothing.
 class ByteReader {
  public:
   ByteReader(const char* record, const std::uint8_t* data, std::size_t size)
@@ -25,8 +26,8 @@ class ByteReader {
     Need(1, part);
     return data_[pos_++];
   }
-  std::uint16_t U16(const char* part) {
-    Need(2, part);
+  std::uint16_t U16(const char* part, unsigned index = 0) {
+    Need(2, part, index);
     const auto value = static_cast<std::uint16_t>(data_[pos_] << 8 | data_[pos_ + 1]);
     pos_ += 2;
     return value;
@@ -35,18 +36,22 @@ class ByteReader {
     const std::uint32_t high = U16(part);
     return high << 16 | U16(part);
   }
-  void Skip(std::size_t count, const std::string& part) {
-    Need(count, part);
+  // Skips `count` bytes that the record declared for part `index` of `part` (or, with index 0,
+  // `count` bytes of fixed fields).
+  void Skip(std::size_t count, const char* part, unsigned index = 0, bool declared = false) {
+    Need(count, part, index, declared);
     pos_ += count;
   }
-  std::size_t Remaining() const { return size_ - pos_; }
 
  private:
-  void Need(std::size_t count, const std::string& part) const {
-    if (count > size_ - pos_)
-      Fail(std::string(record_) + ": truncated: " + part + " needs " + std::to_string(count) +
-           " byte" + (count == 1 ? "" : "s") + " at offset " + std::to_string(pos_) + ", " +
-           std::to_string(size_ - pos_) + " remain");
+  void Need(std::size_t count, const char* part, unsigned index = 0, bool declared = false) const {
+    if (count <= size_ - pos_) return;
+    std::string name = part;
+    if (index) name += " " + std::to_string(index);
+    if (declared) name += " (declared " + std::to_string(count) + " bytes)";
+    Fail(std::string(record_) + ": truncated: " + name + " needs " + std::to_string(count) +
+         " byte" + (count == 1 ? "" : "s") + " at offset " + std::to_string(pos_) + ", " +
+         std::to_string(size_ - pos_) + " remain");
   }
 
   const char* record_;
@@ -79,13 +84,10 @@ class BitReader {
   std::size_t pos_ = 0;
 };
 
-// Every array of parameter sets of an avcC or hvcC record must lie within the record.
-void CheckUnits(ByteReader& reader, unsigned count, const char* kind) {
-  for (unsigned i = 0; i < count; ++i) {
-    const std::string name = std::string(kind) + " " + std::to_string(i + 1);
-    const std::uint16_t length = reader.U16((name + " length").c_str());
-    reader.Skip(length, name + " (declared " + std::to_string(length) + " bytes)");
-  }
+// Every array of parameter sets of an avcC or hvcC record must lie within the record. `length`
+// names the length field of one, `kind` the unit.
+void CheckUnits(ByteReader& reader, unsigned count, const char* length, const char* kind) {
+  for (unsigned i = 0; i < count; ++i) reader.Skip(reader.U16(length, i + 1), kind, i + 1, true);
 }
 
 int AacSampleRate(unsigned index, BitReader& bits) {
@@ -163,8 +165,10 @@ AvcConfig ParseAvcConfig(const std::uint8_t* data, std::size_t size) {
   const unsigned lengthSize = (reader.U8("lengthSizeMinusOne") & 3u) + 1;
   if (lengthSize == 3) Fail("avcC: lengthSizeMinusOne 2 is not allowed");
   config.nalLengthSize = static_cast<std::uint8_t>(lengthSize);
-  CheckUnits(reader, reader.U8("numOfSequenceParameterSets") & 0x1fu, "sequence parameter set");
-  CheckUnits(reader, reader.U8("numOfPictureParameterSets"), "picture parameter set");
+  CheckUnits(reader, reader.U8("numOfSequenceParameterSets") & 0x1fu, "sequenceParameterSetLength",
+             "sequence parameter set");
+  CheckUnits(reader, reader.U8("numOfPictureParameterSets"), "pictureParameterSetLength",
+             "picture parameter set");
   return config;
 }
 
@@ -178,7 +182,7 @@ HevcConfig ParseHevcConfig(const std::uint8_t* data, std::size_t size) {
   const unsigned arrays = reader.U8("numOfArrays");
   for (unsigned i = 0; i < arrays; ++i) {
     reader.U8("NAL_unit_type");
-    CheckUnits(reader, reader.U16("numNalus"), "NAL unit");
+    CheckUnits(reader, reader.U16("numNalus"), "nalUnitLength", "NAL unit");
   }
   return config;
 }
@@ -197,7 +201,7 @@ Vp9Config ParseVp9Config(const std::uint8_t* data, std::size_t size) {
   config.fullRange = (packed & 1) != 0;
   reader.Skip(3, "colourPrimaries to matrixCoefficients");
   const std::uint16_t initSize = reader.U16("codecIntializationDataSize");
-  reader.Skip(initSize, "codecIntializationData (declared " + std::to_string(initSize) + " bytes)");
+  reader.Skip(initSize, "codecIntializationData", 0, true);
   if (config.bitDepth != 8 && config.bitDepth != 10 && config.bitDepth != 12)
     Fail("vpcC: bitDepth " + std::to_string(config.bitDepth) + " is not 8, 10 or 12");
   return config;

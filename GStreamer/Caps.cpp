@@ -297,6 +297,67 @@ bool HasRecord(const std::string& codecId) {
 
 // ----- Writing caps fields --------------------------------------------------------------------
 
+// Values go into the structure by quark, taken rather than copied: no argument list is parsed on
+// the way. The quarks of the fields ToCaps writes are looked up once.
+struct FieldQuarks {
+  GQuark width = g_quark_from_static_string("width");
+  GQuark height = g_quark_from_static_string("height");
+  GQuark framerate = g_quark_from_static_string("framerate");
+  GQuark pixelAspectRatio = g_quark_from_static_string("pixel-aspect-ratio");
+  GQuark format = g_quark_from_static_string("format");
+  GQuark rate = g_quark_from_static_string("rate");
+  GQuark channels = g_quark_from_static_string("channels");
+  GQuark channelMask = g_quark_from_static_string("channel-mask");
+  GQuark streamFormat = g_quark_from_static_string("stream-format");
+  GQuark alignment = g_quark_from_static_string("alignment");
+  GQuark codecData = g_quark_from_static_string("codec_data");
+};
+
+const FieldQuarks& Quarks() {
+  static const FieldQuarks quarks;
+  return quarks;
+}
+
+void TakeValue(GstStructure* s, GQuark name, GValue& value) {
+  gst_structure_id_take_value(s, name, &value);
+}
+
+void TakeValue(GstStructure* s, const char* name, GValue& value) {
+  gst_structure_id_take_value(s, g_quark_from_static_string(name), &value);
+}
+
+template <class Name>
+void SetInt(GstStructure* s, Name name, int number) {
+  GValue value = G_VALUE_INIT;
+  g_value_init(&value, G_TYPE_INT);
+  g_value_set_int(&value, number);
+  TakeValue(s, name, value);
+}
+
+void SetBoolean(GstStructure* s, const char* name, bool flag) {
+  GValue value = G_VALUE_INIT;
+  g_value_init(&value, G_TYPE_BOOLEAN);
+  g_value_set_boolean(&value, flag ? TRUE : FALSE);
+  TakeValue(s, name, value);
+}
+
+// `text` lives as long as the program: the table's texts and GStreamer's format names.
+template <class Name>
+void SetStaticString(GstStructure* s, Name name, const char* text) {
+  GValue value = G_VALUE_INIT;
+  g_value_init(&value, G_TYPE_STRING);
+  g_value_set_static_string(&value, text);
+  TakeValue(s, name, value);
+}
+
+template <class Name>
+void SetFraction(GstStructure* s, Name name, int numerator, int denominator) {
+  GValue value = G_VALUE_INIT;
+  g_value_init(&value, GST_TYPE_FRACTION);
+  gst_value_set_fraction(&value, numerator, denominator);
+  TakeValue(s, name, value);
+}
+
 int CapsInt(const std::string& setting, long long value) {
   if (value < 0 || value > INT_MAX)
     Fail(setting, std::to_string(value) + " is outside GStreamer's integer range");
@@ -308,13 +369,13 @@ void SetField(GstStructure* s, const CapsField& field) {
     case CapsFieldType::kNone:
       break;
     case CapsFieldType::kString:
-      gst_structure_set(s, field.name, G_TYPE_STRING, field.text, nullptr);
+      SetStaticString(s, field.name, field.text);
       break;
     case CapsFieldType::kInt:
-      gst_structure_set(s, field.name, G_TYPE_INT, field.number, nullptr);
+      SetInt(s, field.name, field.number);
       break;
     case CapsFieldType::kBoolean:
-      gst_structure_set(s, field.name, G_TYPE_BOOLEAN, field.number ? TRUE : FALSE, nullptr);
+      SetBoolean(s, field.name, field.number != 0);
       break;
   }
 }
@@ -327,20 +388,17 @@ void SetVideo(GstStructure* s, IFormatCodecVideo& video, const CapsMapping& row)
     if (!format)
       Fail(IFormatCodecVideo::TAG_PIX_FMT,
            "pixel format " + std::to_string(video.GetPixelFormat()) + " has no GStreamer format");
-    gst_structure_set(s, "format", G_TYPE_STRING, format, nullptr);
+    SetStaticString(s, Quarks().format, format);
   }
   if (video.ExistsWidth())
-    gst_structure_set(s, "width", G_TYPE_INT,
-                      CapsInt(IFormatCodecVideo::TAG_WIDTH, video.GetWidth()), nullptr);
+    SetInt(s, Quarks().width, CapsInt(IFormatCodecVideo::TAG_WIDTH, video.GetWidth()));
   if (video.ExistsHeight())
-    gst_structure_set(s, "height", G_TYPE_INT,
-                      CapsInt(IFormatCodecVideo::TAG_HEIGHT, video.GetHeight()), nullptr);
+    SetInt(s, Quarks().height, CapsInt(IFormatCodecVideo::TAG_HEIGHT, video.GetHeight()));
   if (video.ExistsFrameRateNum() && video.ExistsFrameRateDen()) {
     const int den = CapsInt(IFormatCodecVideo::TAG_TIMEBASE_D, video.GetFrameRateDen());
     if (den == 0) Fail(IFormatCodecVideo::TAG_TIMEBASE_D, "a frame rate denominator of 0");
-    gst_structure_set(s, "framerate", GST_TYPE_FRACTION,
-                      CapsInt(IFormatCodecVideo::TAG_TIMEBASE_N, video.GetFrameRateNum()), den,
-                      nullptr);
+    SetFraction(s, Quarks().framerate,
+                CapsInt(IFormatCodecVideo::TAG_TIMEBASE_N, video.GetFrameRateNum()), den);
   }
   if (video.ExistsPixelAspectX() && video.ExistsPixelAspectY()) {
     const int x = CapsInt(IFormatCodecVideo::TAG_ASPECTX, video.GetPixelAspectX());
@@ -348,7 +406,7 @@ void SetVideo(GstStructure* s, IFormatCodecVideo& video, const CapsMapping& row)
     if (x == 0 || y == 0)
       Fail(x == 0 ? IFormatCodecVideo::TAG_ASPECTX : IFormatCodecVideo::TAG_ASPECTY,
            "a pixel aspect of 0");
-    gst_structure_set(s, "pixel-aspect-ratio", GST_TYPE_FRACTION, x, y, nullptr);
+    SetFraction(s, Quarks().pixelAspectRatio, x, y);
   }
 }
 
@@ -358,16 +416,21 @@ void SetAudio(GstStructure* s, IFormatCodecAudio& audio) {
     if (rate <= 0)
       Fail(IFormatCodecAudio::TAG_SAMPLE_RATE,
            "expected a positive rate, found " + std::to_string(rate));
-    gst_structure_set(s, "rate", G_TYPE_INT, rate, nullptr);
+    SetInt(s, Quarks().rate, rate);
   }
   if (audio.ExistsChannelLayout()) {
     const std::uint32_t layout = audio.GetChannelLayout();
     const guint64 mask = ToChannelMask(layout);
     const int channels = SpeakerCount(layout);
     if (channels == 0) Fail(IFormatCodecAudio::TAG_LAYOUT, "a layout without speakers");
-    gst_structure_set(s, "channels", G_TYPE_INT, channels, nullptr);
+    SetInt(s, Quarks().channels, channels);
     // One channel is GStreamer's mono, which has no position.
-    if (channels > 1) gst_structure_set(s, "channel-mask", GST_TYPE_BITMASK, mask, nullptr);
+    if (channels > 1) {
+      GValue value = G_VALUE_INIT;
+      g_value_init(&value, GST_TYPE_BITMASK);
+      gst_value_set_bitmask(&value, mask);
+      TakeValue(s, Quarks().channelMask, value);
+    }
   }
 }
 
@@ -377,17 +440,17 @@ void SetPrivateData(GstStructure* s, IFormatCodec& description, const CapsMappin
   const bool byteStream = present && CodecString::IsByteStream(blob->GetData(), blob->GetSize());
   const bool packaged = present && !byteStream;
   if (row.packagedFormat || row.bareFormat)
-    gst_structure_set(s, "stream-format", G_TYPE_STRING,
-                      packaged && row.packagedFormat ? row.packagedFormat : row.bareFormat,
-                      nullptr);
-  if (row.alignment) gst_structure_set(s, "alignment", G_TYPE_STRING, row.alignment, nullptr);
+    SetStaticString(s, Quarks().streamFormat,
+                    packaged && row.packagedFormat ? row.packagedFormat : row.bareFormat);
+  if (row.alignment) SetStaticString(s, Quarks().alignment, row.alignment);
   // An Annex B byte stream carries its parameter sets in band.
   if (!present || (byteStream && row.bareFormat)) return;
   if (HasRecord(row.codecId))
     CheckRecord(row.codecId, blob->GetData(), blob->GetSize(), "private data");
-  GstBuffer* buffer = gst_buffer_new_memdup(blob->GetData(), blob->GetSize());
-  gst_structure_set(s, "codec_data", GST_TYPE_BUFFER, buffer, nullptr);
-  gst_buffer_unref(buffer);
+  GValue value = G_VALUE_INIT;
+  g_value_init(&value, GST_TYPE_BUFFER);
+  gst_value_take_buffer(&value, gst_buffer_new_memdup(blob->GetData(), blob->GetSize()));
+  TakeValue(s, Quarks().codecData, value);
 }
 
 // ----- Reading caps into a description --------------------------------------------------------
@@ -564,7 +627,7 @@ GstCaps* ToCaps(const boost::intrusive_ptr<IFormatCodec>& description) {
   const std::string codecId = description->GetCodecID();
   const CapsMapping* row = FindCapsMapping(codecId, codecType);
   if (!row) Fail(IFormatCodec::TAG_CODEC_ID, "'" + codecId + "' has no GStreamer media type");
-  GstStructure* s = gst_structure_new_empty(row->mediaType);
+  GstStructure* s = gst_structure_new_id_empty(g_quark_from_static_string(row->mediaType));
   CapsPtr caps(gst_caps_new_full(s, nullptr));
   SetField(s, row->fields[0]);
   SetField(s, row->fields[1]);
