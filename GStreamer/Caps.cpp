@@ -265,7 +265,12 @@ const CapsMapping& FindRow(const GstStructure* s) {
   }
   if (best) return *best;
   if (!ofType) Fail("", std::string("media type '") + mediaType + "' is not known");
+  // Name the field that tells the codecs apart: the second when some row has the first.
   const char* field = ofType->fields[0].name;
+  for (std::size_t i = 0; i < count; ++i)
+    if (std::strcmp(rows[i].mediaType, mediaType) == 0 && rows[i].fields[1].name &&
+        Matches(s, rows[i].fields[0]))
+      field = rows[i].fields[1].name;
   const GValue* value = gst_structure_get_value(s, field);
   if (!value) Fail(field, std::string("missing; ") + mediaType + " needs it to name the codec");
   Text text(gst_value_serialize(value));
@@ -536,6 +541,8 @@ void ReadAudio(const GstStructure* s, IFormatCodecAudio& audio, const CapsMappin
   }
   if (std::strcmp(row.mediaType, "audio/x-raw") == 0) {
     const GstAudioFormat format = gst_audio_format_from_string(row.fields[0].text);
+    if (format == GST_AUDIO_FORMAT_UNKNOWN)
+      Fail("format", std::string(row.fields[0].text) + " is not known to this GStreamer");
     const GstAudioFormatInfo* info = gst_audio_format_get_info(format);
     audio.SetSampleFormat(
         LibavSampleFormat(*info, std::strcmp(row.fields[1].text, "non-interleaved") == 0));

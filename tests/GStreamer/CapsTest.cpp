@@ -263,6 +263,8 @@ TEST_F(GStreamerCapsTest, BadCapsNameTheField) {
       {"audio/mpeg, mpegversion=(int)3", "mpegversion"},
       {"audio/mpeg, mpegversion=(string)4", "mpegversion"},
       {"audio/mpeg", "mpegversion"},
+      {"audio/mpeg, mpegversion=(int)1, layer=(int)1", "layer"},
+      {"video/mpeg, mpegversion=(int)2, systemstream=(boolean)true", "systemstream"},
       {"audio/x-raw, format=(string)S16LE, layout=(string)interleaved, rate=(int)0", "rate"},
       {"audio/x-raw, format=(string)S16LE, layout=(string)interleaved, channels=(int)3, "
        "channel-mask=(bitmask)0x3",

@@ -96,7 +96,7 @@ std::string ReadFile(const std::string& option, const std::string& path) {
 boost::intrusive_ptr<IFormatCodec> FromCaps(const std::string& text,
                                             Tarvek::Conf::FormatKind kind) {
 #if TARVEK_FORMATDESC_GSTREAMER
-  gst_init(nullptr, nullptr);
+  InitGStreamer();
   boost::intrusive_ptr<IFormatCodec> description;
   try {
     description = Tarvek::GStreamer::FromCapsString(text);
