@@ -7,6 +7,9 @@
 #include <Tarvek/FFmpeg/Streams.h>
 
 #include <boost/exception/get_error_info.hpp>
+#if TARVEK_FORMATDESC_GSTREAMER
+#include <Tarvek/GStreamer/Caps.h>
+#endif
 #include <cerrno>
 #include <cstdio>
 #include <cstring>
@@ -92,10 +95,38 @@ std::string ReadFile(const std::string& option, const std::string& path) {
   return text;
 }
 
-// The --from-json description as the subcommand's kind, or a new one of that kind.
+// The description that GStreamer caps text gives, which must be of `kind`.
+boost::intrusive_ptr<IFormatCodec> FromCaps(const std::string& text,
+                                            Tarvek::Conf::FormatKind kind) {
+#if TARVEK_FORMATDESC_GSTREAMER
+  InitGStreamer();
+  boost::intrusive_ptr<IFormatCodec> description;
+  try {
+    description = Tarvek::GStreamer::FromCapsString(text);
+  } catch (const Tarvek::GStreamer::CapsError& e) {
+    const std::string* what = boost::get_error_info<Tarvek::DescriptionInfo>(e);
+    throw UsageError("--from-caps: " + (what != nullptr ? *what : std::string("not caps")));
+  }
+  const std::optional<Tarvek::Conf::FormatKind> found = Tarvek::Conf::KindOf(description.get());
+  if (found != kind)
+    throw UsageError(std::string("--from-caps: the caps give ") +
+                     Tarvek::Conf::KindPhrase(found.value_or(Tarvek::Conf::FormatKind::Codec)) +
+                     ", not " + Tarvek::Conf::KindPhrase(kind));
+  return description;
+#else
+  (void)text;
+  (void)kind;
+  throw UsageError("--from-caps: this formatdesc was built without GStreamer");
+#endif
+}
+
+// The --from-json or --from-caps description as the subcommand's kind, or a new one of that
+// kind.
 template <class Kind, class Factory>
 boost::intrusive_ptr<Kind> Start(const CodecArgs& args, Tarvek::Conf::FormatKind kind,
                                  Factory create) {
+  if (args.fromJson && args.fromCaps) throw UsageError("--from-caps excludes --from-json");
+  if (args.fromCaps) return boost::dynamic_pointer_cast<Kind>(FromCaps(*args.fromCaps, kind));
   if (!args.fromJson) return create();
   return boost::dynamic_pointer_cast<Kind>(RequireKind(
       LoadDescription("--from-json", *args.fromJson, args.stream), kind, *args.fromJson));

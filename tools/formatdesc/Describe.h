@@ -24,6 +24,7 @@ namespace Formatdesc {
 struct CodecArgs {
   std::optional<std::string> fromJson;  // a file holding the description to start from
   std::optional<std::string> stream;    // which stream of a --from-json file of several
+  std::optional<std::string> fromCaps;  // GStreamer caps text to start from
   std::optional<std::string> codecId;
   std::optional<std::string> codecName;
   std::optional<std::string> tag;

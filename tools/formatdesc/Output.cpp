@@ -13,6 +13,12 @@
 
 #include <Tarvek/Inspect/JsonLayout.h>
 
+#include <Tarvek/CodecString/CodecString.h>
+#include <boost/exception/get_error_info.hpp>
+#if TARVEK_FORMATDESC_GSTREAMER
+#include <Tarvek/GStreamer/Caps.h>
+#endif
+
 extern "C" {
 #include <libavutil/pixdesc.h>
 #include <libavutil/samplefmt.h>
@@ -88,6 +94,47 @@ Derived Derive(const IFormatCodec& codec) {
     DeriveAudio(*audio, derived);
   }
   return derived;
+}
+
+// What another media stack takes: the description's GStreamer caps and its streaming codec
+// string, or why there are none.
+struct Handover {
+  std::string text;
+  bool made = false;
+};
+
+template <class Error, class Make>
+Handover Hand(Make make) {
+  try {
+    return {make(), true};
+  } catch (const Error& error) {
+    const std::string* what = boost::get_error_info<Tarvek::DescriptionInfo>(error);
+    return {what ? *what : std::string("not available"), false};
+  }
+}
+
+Handover CapsOf(const boost::intrusive_ptr<IFormatCodec>& codec) {
+#if TARVEK_FORMATDESC_GSTREAMER
+  InitGStreamer();
+  return Hand<Tarvek::GStreamer::CapsError>([&] { return Tarvek::GStreamer::ToCapsString(codec); });
+#else
+  (void)codec;
+  return {"this formatdesc was built without GStreamer", false};
+#endif
+}
+
+Handover CodecStringOf(const boost::intrusive_ptr<IFormatCodec>& codec) {
+  return Hand<Tarvek::CodecString::CodecStringError>(
+      [&] { return Tarvek::CodecString::GetCodecString(codec); });
+}
+
+std::string HandoverText(const Handover& handover) {
+  return handover.made ? handover.text : "none (" + handover.text + ")";
+}
+
+void HandoverJson(nlohmann::ordered_json& json, const std::string& key, const Handover& handover) {
+  json[key] = handover.made ? nlohmann::ordered_json(handover.text) : nlohmann::ordered_json();
+  if (!handover.made) json[key + "_reason"] = handover.text;
 }
 
 std::vector<std::pair<std::string, std::string>> SummaryLines(
@@ -180,6 +227,15 @@ void PrintWrapped(std::ostream& out, const std::vector<std::string>& ids) {
 
 }  // namespace
 
+void InitGStreamer() {
+#if TARVEK_FORMATDESC_GSTREAMER
+  // The tool builds and reads caps only and runs no element, so GStreamer's plugin registry is
+  // left unread: that saves most of gst_init's time (unless the user asks otherwise).
+  g_setenv("GST_REGISTRY_DISABLE", "yes", FALSE);
+  gst_init(nullptr, nullptr);
+#endif
+}
+
 std::string ReadableBitrate(long long bitsPerSecond) {
   const bool negative = bitsPerSecond < 0;
   const unsigned long long magnitude = negative
@@ -220,6 +276,9 @@ void PrintDescription(IFormatCodec& codec, const std::optional<Bitrates>& bitrat
     const std::size_t size = data->GetSize();
     lines.emplace_back("Private data", std::to_string(size) + (size == 1 ? " byte" : " bytes"));
   }
+  const boost::intrusive_ptr<IFormatCodec> held(&codec);
+  lines.emplace_back("Caps", HandoverText(CapsOf(held)));
+  lines.emplace_back("Codec string", HandoverText(CodecStringOf(held)));
   lines.insert(lines.end(), extra.begin(), extra.end());
   if (lines.empty()) return;
   std::cout << "======Summary:=============\n";
@@ -243,6 +302,8 @@ nlohmann::ordered_json DescriptionJson(const boost::intrusive_ptr<IFormatCodec>&
   if (derived.layout) json["channel_layout_name"] = *derived.layout;
   if (derived.channels) json["channels"] = *derived.channels;
   if (derived.sampleFormat) json["sample_fmt_name"] = *derived.sampleFormat;
+  HandoverJson(json, "caps", CapsOf(codec));
+  HandoverJson(json, "codec_string", CodecStringOf(codec));
   if (bitrates) json["bitrate"] = BitratesJson(*bitrates);
   return json;
 }

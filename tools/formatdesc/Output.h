@@ -24,6 +24,10 @@ namespace Formatdesc {
 /// a repeated name, as the library's look-ups find it), leaves as their values.
 nlohmann::ordered_json SettingsJson(const Tarvek::Core::Property& tree);
 
+/// Readies GStreamer for the caps in the summary and --from-caps, once per process; a no-op in a
+/// tool built without GStreamer.
+void InitGStreamer();
+
 /// "4.50 Mb/s" from 1 Mb/s up, "128.00 kb/s" below, both rounded to two places.
 std::string ReadableBitrate(long long bitsPerSecond);
 /// "4.50 Mb/s (4500000 b/s)".

@@ -99,6 +99,10 @@ void AddSwitch(CLI::App& app, const std::string& name, std::optional<bool>& valu
 void AddCodecOptions(CLI::App& app, CodecArgs& args, const std::string& idHelp) {
   AddText(app, "--from-json", args.fromJson, kFromJsonHelp, "FILE");
   AddText(app, "--stream", args.stream, kStreamHelp, "SPEC");
+  AddText(app, "--from-caps", args.fromCaps,
+          "Start from the description that GStreamer caps give (as the summary's Caps line "
+          "shows them); the options change it",
+          "CAPS");
   const std::string group = "Codec settings";
   AddText(app, "--codec-id", args.codecId, idHelp, "ID")->group(group);
   AddText(app, "--codec-name", args.codecName, "Codec name (free text)")->group(group);
