@@ -125,6 +125,13 @@ struct Property::Internals {
   static auto Find(Self& self, const std::string& key, std::uint32_t hash) noexcept
       -> decltype(self.children_.end()) {
     if (Usable(self)) return self.storage_.index->Find(key, hash, self.children_.end());
+    return Scan(self, key, hash);
+  }
+
+  // The first child of `self` named `key` by walking the children, or their end.
+  template <class Self>
+  static auto Scan(Self& self, const std::string& key, std::uint32_t hash) noexcept
+      -> decltype(self.children_.end()) {
     for (auto it = self.children_.begin(); it != self.children_.end(); ++it) {
       if (HasName(*it, key, hash)) return it;
     }
@@ -354,8 +361,12 @@ const Property& Property::operator[](const std::string& key) const {
   return *found;
 }
 
+// Called by the inline look-ups for containers with an index only, so kept lean: the probe, and
+// the walk only while the index is stale.
 Property::const_iterator Property::FindIndexed(const PropertyKey& key) const noexcept {
-  return Internals::Find(*this, key.name_, key.hash_);
+  const ChildIndex* const index = storage_.index;
+  if (index->Stale()) return Internals::Scan(*this, key.name_, key.hash_);
+  return index->Find(key.name_, key.hash_, children_.end());
 }
 
 PropertyKey::PropertyKey(const std::string& name) : name_(name), hash_(Hash(name)) {}
