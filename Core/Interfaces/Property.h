@@ -100,7 +100,7 @@ class TARVEK_CORE_API Property {
   /// The node's name.
   const std::string& GetName() const noexcept { return name_; }
   /// The node's type.
-  PropertyTypes GetType() const noexcept { return static_cast<PropertyTypes>(type_); }
+  PropertyTypes GetType() const noexcept { return static_cast<PropertyTypes>(link_ & kTypeBits); }
   /// The children, in the order they were added.
   const Children& GetChildren() const noexcept { return children_; }
 
@@ -156,7 +156,7 @@ class TARVEK_CORE_API Property {
  private:
   struct Internals;  // helpers with access to the members, in the library
   class ChildIndex;  // a large container's index of its children by name, in the library
-  // A leaf's value or a container's index (null when it has none); type_ tells which member lives.
+  // A leaf's value or a container's index (null when it has none); the type tells which lives.
   union Storage {
     Storage() noexcept : index(nullptr) {}
     ~Storage() {}
@@ -180,12 +180,12 @@ class TARVEK_CORE_API Property {
 
   std::string name_;
   Storage storage_;
-  // The index of the parent's children when the parent has one: a child renamed in place tells
-  // that index it can no longer be trusted, so no look-up gives a stale answer and nothing
-  // outside the tree is written.
-  ChildIndex* parent_index_;
-  std::uint32_t name_hash_;  // a hash of name_, compared before the texts
-  unsigned char type_;       // a PropertyTypes value
+  // One word for two things, to keep nodes small: the type (a PropertyTypes value) in the low
+  // three bits, and the address of the parent's index, when the parent has one, in the others (an
+  // index is 8-aligned). A child renamed in place marks that index stale, so no look-up answers
+  // wrongly and nothing outside the tree is written.
+  std::uintptr_t link_;
+  static constexpr std::uintptr_t kTypeBits = 7;  // the bits of link_ that hold the type
   Children children_;
 };
 
@@ -267,19 +267,19 @@ Property& Property::SetChildT(const std::string& name, const T& value) {
 
 // The typed getters are inline: a read is a type test and a load.
 inline bool Property::GetBool() const {
-  if (type_ == PropertyTypeBool) return storage_.flag;
+  if (GetType() == PropertyTypeBool) return storage_.flag;
   ThrowWrongType(PropertyTypeBool, "GetBool", Detail::kPropertyHeader, __LINE__,
                  BOOST_CURRENT_FUNCTION);
 }
 
 inline long long Property::GetInt64() const {
-  if (type_ == PropertyTypeInt64) return storage_.integer;
+  if (GetType() == PropertyTypeInt64) return storage_.integer;
   ThrowWrongType(PropertyTypeInt64, "GetInt64", Detail::kPropertyHeader, __LINE__,
                  BOOST_CURRENT_FUNCTION);
 }
 
 inline const std::string& Property::GetString() const {
-  if (type_ == PropertyTypeString) return storage_.text;
+  if (GetType() == PropertyTypeString) return storage_.text;
   ThrowWrongType(PropertyTypeString, "GetString", Detail::kPropertyHeader, __LINE__,
                  BOOST_CURRENT_FUNCTION);
 }
@@ -299,12 +299,12 @@ class TARVEK_CORE_API PropertyKey {
   std::uint32_t hash_;
 };
 
-// Look-ups by key are inline where a container has no index: a walk that compares the hashes
-// first. A container with an index answers in one call into the library.
+// Look-ups by key are inline where a container has no index: a walk that compares the names. A
+// container with an index answers in one call into the library.
 inline Property::const_iterator Property::FindChild(const PropertyKey& key) const noexcept {
-  if (type_ == PropertyTypeContainer && storage_.index != nullptr) return FindIndexed(key);
+  if (GetType() == PropertyTypeContainer && storage_.index != nullptr) return FindIndexed(key);
   for (const_iterator it = children_.begin(); it != children_.end(); ++it) {
-    if (it->name_hash_ == key.hash_ && it->name_ == key.name_) return it;
+    if (it->name_ == key.name_) return it;
   }
   return children_.end();
 }

@@ -52,13 +52,14 @@ inline bool SameName(const std::string& a, const std::string& b) noexcept {
 
 }  // namespace Detail
 
-class alignas(Property::iterator) Property::ChildIndex {
+class alignas(8) Property::ChildIndex {
  public:
   static_assert(std::is_trivially_copyable_v<iterator> &&
                     std::is_trivially_destructible_v<iterator>,
                 "index slots are raw copies of list iterators");
-  static_assert(alignof(iterator) <= __STDCPP_DEFAULT_NEW_ALIGNMENT__,
-                "index blocks come from operator new");
+  static_assert(alignof(iterator) <= 8 && 8 <= __STDCPP_DEFAULT_NEW_ALIGNMENT__,
+                "index blocks come from operator new, 8-aligned: a node keeps its type in the "
+                "low bits of its parent's index address");
 
   // An empty index with room for `names` distinct names, or null when the block cannot be had.
   static ChildIndex* Create(std::size_t names) noexcept {
@@ -81,10 +82,7 @@ class alignas(Property::iterator) Property::ChildIndex {
     const unsigned char* const control = Control();
     for (std::uint32_t i = hash & mask_;; i = (i + 1) & mask_) {
       if (control[i] == 0) return end;
-      if (control[i] == tag) {
-        const iterator child = Slots()[i];
-        if (child->name_hash_ == hash && Detail::SameName(child->name_, name)) return child;
-      }
+      if (control[i] == tag && Detail::SameName(Slots()[i]->name_, name)) return Slots()[i];
     }
   }
 
@@ -93,9 +91,9 @@ class alignas(Property::iterator) Property::ChildIndex {
     return (std::uint64_t{names_} + 1) * 4 <= (std::uint64_t{mask_} + 1) * 3;
   }
 
-  // Enters `child` unless an earlier child has its name. The table has room.
-  void Enter(iterator child) noexcept {
-    const std::uint32_t hash = child->name_hash_;
+  // Enters `child`, whose name's hash is `hash`, unless an earlier child has its name. The table
+  // has room.
+  void Enter(iterator child, std::uint32_t hash) noexcept {
     const unsigned char tag = Tag(hash);
     unsigned char* const control = Control();
     for (std::uint32_t i = hash & mask_;; i = (i + 1) & mask_) {
@@ -105,10 +103,7 @@ class alignas(Property::iterator) Property::ChildIndex {
         ++names_;
         return;
       }
-      if (control[i] == tag && child->name_hash_ == Slots()[i]->name_hash_ &&
-          Detail::SameName(Slots()[i]->name_, child->name_)) {
-        return;
-      }
+      if (control[i] == tag && Detail::SameName(Slots()[i]->name_, child->name_)) return;
     }
   }
 

@@ -86,17 +86,16 @@ std::uint32_t Hash(const std::string& name) noexcept {
 
 }  // namespace
 
-// Look-up by name. Every node keeps a 32-bit hash of its name, so a scan of the children compares
-// texts only where the hashes agree. A container with kIndexThreshold children or more also keeps
-// an index (ChildIndex.h).
+// Look-up by name. A container with kIndexThreshold children or more keeps an index of them by a
+// hash of their names (ChildIndex.h); a smaller one is scanned, comparing lengths first.
 //
 // Renames. An index finds a child under the name it had when it was entered. A node that is a
 // child can be renamed in place only by moving into it or out of it. Every child of an indexed
-// container points to that index (parent_index_), and a renamed child marks it stale: look-ups in
+// container points to that index (in link_), and a renamed child marks it stale: look-ups in
 // that container then scan until the next append rebuilds the index. Renaming children in place is
 // rare, so this costs nothing in practice; no look-up ever gives a wrong answer, and look-ups write
 // nothing, so trees shared for reading stay safe to read from any number of threads.
-// Invariant: a child's parent_index_ is null or its parent's current index. Only BuildIndex
+// Invariant: a child's parent index is null or its parent's current index. Only BuildIndex
 // replaces an index while the children live on, and it updates them all.
 //
 // The index is a cache: when its block cannot be allocated there is none, and look-ups scan.
@@ -104,36 +103,33 @@ std::uint32_t Hash(const std::string& name) noexcept {
 struct Property::Internals {
   static constexpr std::size_t kIndexThreshold = 8;
 
-  static bool HasName(const Property& node, const std::string& key, std::uint32_t hash) noexcept {
-    return node.name_hash_ == hash && Detail::SameName(node.name_, key);
+  static ChildIndex* ParentIndex(const Property& node) noexcept {
+    return reinterpret_cast<ChildIndex*>(node.link_ & ~kTypeBits);
+  }
+  static void SetParentIndex(Property& node, ChildIndex* index) noexcept {
+    node.link_ = reinterpret_cast<std::uintptr_t>(index) | (node.link_ & kTypeBits);
+  }
+  static void SetType(Property& node, PropertyTypes type) noexcept {
+    node.link_ = (node.link_ & ~kTypeBits) | static_cast<std::uintptr_t>(type);
   }
 
   static bool Usable(const Property& node) noexcept {
-    return node.type_ == PropertyTypeContainer && node.storage_.index != nullptr &&
+    return node.GetType() == PropertyTypeContainer && node.storage_.index != nullptr &&
            !node.storage_.index->Stale();
   }
 
   // The first child of `self` named `key`, or the end of its children.
   template <class Self>
   static auto Find(Self& self, const std::string& key) noexcept -> decltype(self.children_.end()) {
-    if (self.children_.empty()) return self.children_.end();
-    return Find(self, key, Hash(key));
-  }
-
-  // The same, with the hash of `key` already worked out.
-  template <class Self>
-  static auto Find(Self& self, const std::string& key, std::uint32_t hash) noexcept
-      -> decltype(self.children_.end()) {
-    if (Usable(self)) return self.storage_.index->Find(key, hash, self.children_.end());
-    return Scan(self, key, hash);
+    if (Usable(self)) return self.storage_.index->Find(key, Hash(key), self.children_.end());
+    return Scan(self, key);
   }
 
   // The first child of `self` named `key` by walking the children, or their end.
   template <class Self>
-  static auto Scan(Self& self, const std::string& key, std::uint32_t hash) noexcept
-      -> decltype(self.children_.end()) {
+  static auto Scan(Self& self, const std::string& key) noexcept -> decltype(self.children_.end()) {
     for (auto it = self.children_.begin(); it != self.children_.end(); ++it) {
-      if (HasName(*it, key, hash)) return it;
+      if (Detail::SameName(it->name_, key)) return it;
     }
     return self.children_.end();
   }
@@ -150,25 +146,26 @@ struct Property::Internals {
     node.storage_.index = index;
     if (index == nullptr && !had) return;  // no child points to an index
     for (auto it = node.children_.begin(); it != node.children_.end(); ++it) {
-      if (index != nullptr) index->Enter(it);
-      it->parent_index_ = index;
+      if (index != nullptr) index->Enter(it, Hash(it->name_));
+      SetParentIndex(*it, index);
     }
   }
 
   // Tells the parent's index, if any, that `node` has a new name.
   static void NoteRename(const Property& node) noexcept {
-    if (node.parent_index_ != nullptr) node.parent_index_->MarkStale();
+    ChildIndex* const parent = ParentIndex(node);
+    if (parent != nullptr) parent->MarkStale();
   }
 
   // Frees what the storage holds (a string or an index); the node is then a container without an
   // index, its children untouched: they must be dropped next (Clear, or the destructor).
   static void Release(Property& node) noexcept {
-    if (node.type_ == PropertyTypeString) {
+    if (node.GetType() == PropertyTypeString) {
       node.storage_.text.~basic_string();
-    } else if (node.type_ == PropertyTypeContainer) {
+    } else if (node.GetType() == PropertyTypeContainer) {
       ChildIndex::Destroy(node.storage_.index);
     }
-    node.type_ = PropertyTypeContainer;
+    SetType(node, PropertyTypeContainer);
     node.storage_.index = nullptr;
   }
 
@@ -188,7 +185,7 @@ struct Property::Internals {
   // Copies `from`'s value into `to`, which holds nothing. A container copies no index: `to`
   // builds its own over its own children. On failure `to` still holds nothing.
   static void CopyValue(Property& to, const Property& from) {
-    switch (from.type_) {
+    switch (from.GetType()) {
       case PropertyTypeBool:
         to.storage_.flag = from.storage_.flag;
         break;
@@ -201,12 +198,12 @@ struct Property::Internals {
       default:
         return;
     }
-    to.type_ = from.type_;
+    SetType(to, from.GetType());
   }
 
   // Moves `from`'s value or index into `to`, which holds nothing; `from` then holds nothing.
   static void MoveValue(Property& to, Property& from) noexcept {
-    switch (from.type_) {
+    switch (from.GetType()) {
       case PropertyTypeBool:
         to.storage_.flag = from.storage_.flag;
         break;
@@ -221,12 +218,12 @@ struct Property::Internals {
         to.storage_.index = from.storage_.index;
         break;
     }
-    to.type_ = from.type_;
-    from.type_ = PropertyTypeContainer;
+    SetType(to, from.GetType());
+    SetType(from, PropertyTypeContainer);
     from.storage_.index = nullptr;
   }
 
-  // Exchanges value (or index) and children; names, hashes and places stay.
+  // Exchanges value (or index) and children; names and places stay.
   static void SwapContent(Property& a, Property& b) noexcept {
     Property held{std::string()};
     MoveValue(held, a);
@@ -235,28 +232,24 @@ struct Property::Internals {
     a.children_.swap(b.children_);
   }
 
-  static void Rename(Property& node, const std::string& name) {
-    node.name_ = name;
-    node.name_hash_ = Hash(node.name_);
-  }
+  static void Rename(Property& node, const std::string& name) { node.name_ = name; }
 };
 
-Property::Property(const std::string& name)
-    : name_(name), parent_index_(nullptr), name_hash_(Hash(name)), type_(PropertyTypeContainer) {}
+Property::Property(const std::string& name) : name_(name), link_(PropertyTypeContainer) {}
 
 Property::Property(const std::string& name, bool value) : Property(name) {
   storage_.flag = value;
-  type_ = PropertyTypeBool;
+  Internals::SetType(*this, PropertyTypeBool);
 }
 
 Property::Property(const std::string& name, long long value) : Property(name) {
   storage_.integer = value;
-  type_ = PropertyTypeInt64;
+  Internals::SetType(*this, PropertyTypeInt64);
 }
 
 Property::Property(const std::string& name, const std::string& value) : Property(name) {
   Internals::PlaceText(*this, std::string(value));
-  type_ = PropertyTypeString;
+  Internals::SetType(*this, PropertyTypeString);
 }
 
 Property::Property(const std::string& name, const char* value)
@@ -265,25 +258,17 @@ Property::Property(const std::string& name, const char* value)
 // The value is copied last, in the body: if it throws, the members built so far are destroyed and
 // the storage holds nothing that would need freeing.
 Property::Property(const Property& other)
-    : name_(other.name_),
-      parent_index_(nullptr),
-      name_hash_(other.name_hash_),
-      type_(PropertyTypeContainer),
-      children_(other.children_) {
+    : name_(other.name_), link_(PropertyTypeContainer), children_(other.children_) {
   Internals::CopyValue(*this, other);
-  if (type_ == PropertyTypeContainer) Internals::BuildIndex(*this);
+  if (GetType() == PropertyTypeContainer) Internals::BuildIndex(*this);
 }
 
 Property::Property(Property&& other) noexcept
-    : name_(std::move(other.name_)),
-      parent_index_(nullptr),
-      name_hash_(other.name_hash_),
-      type_(PropertyTypeContainer) {
+    : name_(std::move(other.name_)), link_(PropertyTypeContainer) {
   // Swapped, not moved: a swap keeps iterators to the elements valid, so the index stays good.
   children_.swap(other.children_);
   Internals::MoveValue(*this, other);
   other.name_.clear();
-  other.name_hash_ = Hash(other.name_);
   if (!name_.empty()) Internals::NoteRename(other);
 }
 
@@ -296,7 +281,7 @@ Property& Property::operator=(const Property& other) {
   copy.children_ = other.children_;
   Internals::CopyValue(copy, other);
   Internals::SwapContent(*this, copy);
-  if (type_ == PropertyTypeContainer) Internals::BuildIndex(*this);
+  if (GetType() == PropertyTypeContainer) Internals::BuildIndex(*this);
   return *this;
 }
 
@@ -306,7 +291,6 @@ Property& Property::operator=(Property&& other) noexcept {
   Property taken(std::move(other));
   if (taken.name_ != name_) Internals::NoteRename(*this);
   name_.swap(taken.name_);
-  std::swap(name_hash_, taken.name_hash_);
   Internals::SwapContent(*this, taken);
   return *this;
 }
@@ -314,20 +298,20 @@ Property& Property::operator=(Property&& other) noexcept {
 Property& Property::operator=(bool value) {
   Internals::Clear(*this);
   storage_.flag = value;
-  type_ = PropertyTypeBool;
+  Internals::SetType(*this, PropertyTypeBool);
   return *this;
 }
 
 Property& Property::operator=(long long value) {
   Internals::Clear(*this);
   storage_.integer = value;
-  type_ = PropertyTypeInt64;
+  Internals::SetType(*this, PropertyTypeInt64);
   return *this;
 }
 
 Property& Property::operator=(const std::string& value) {
   // A string leaf reuses its buffer; assignment leaves it as it was if it throws.
-  if (type_ == PropertyTypeString) {
+  if (GetType() == PropertyTypeString) {
     storage_.text = value;
     return *this;
   }
@@ -335,7 +319,7 @@ Property& Property::operator=(const std::string& value) {
   std::string copy(value);
   Internals::Clear(*this);
   Internals::PlaceText(*this, std::move(copy));
-  type_ = PropertyTypeString;
+  Internals::SetType(*this, PropertyTypeString);
   return *this;
 }
 
@@ -365,7 +349,7 @@ const Property& Property::operator[](const std::string& key) const {
 // the walk only while the index is stale.
 Property::const_iterator Property::FindIndexed(const PropertyKey& key) const noexcept {
   const ChildIndex* const index = storage_.index;
-  if (index->Stale()) return Internals::Scan(*this, key.name_, key.hash_);
+  if (index->Stale()) return Internals::Scan(*this, key.name_);
   return index->Find(key.name_, key.hash_, children_.end());
 }
 
@@ -374,7 +358,7 @@ PropertyKey::PropertyKey(const std::string& name) : name_(name), hash_(Hash(name
 Property& Property::operator[](const std::string& key) {
   const iterator found = Internals::Find(*this, key);
   if (found != children_.end()) return *found;
-  if (type_ != PropertyTypeContainer) {
+  if (GetType() != PropertyTypeContainer) {
     ThrowNotApplicable("operator[]", __LINE__, BOOST_CURRENT_FUNCTION);
   }
   children_.emplace_back(key);
@@ -382,7 +366,7 @@ Property& Property::operator[](const std::string& key) {
 }
 
 Property& Property::SetChild(const std::string& key) {
-  if (type_ != PropertyTypeContainer) {
+  if (GetType() != PropertyTypeContainer) {
     ThrowNotApplicable("SetChild", __LINE__, BOOST_CURRENT_FUNCTION);
   }
   const iterator found = Internals::Find(*this, key);
@@ -395,7 +379,7 @@ Property& Property::SetChild(const std::string& key) {
 }
 
 Property& Property::SetChild(const std::string& key, const Property& value) {
-  if (type_ != PropertyTypeContainer) {
+  if (GetType() != PropertyTypeContainer) {
     ThrowNotApplicable("SetChild", __LINE__, BOOST_CURRENT_FUNCTION);
   }
   const iterator found = Internals::Find(*this, key);
@@ -410,8 +394,8 @@ Property& Property::SetChild(const std::string& key, const Property& value) {
 Property& Property::AdoptLast() noexcept {
   const iterator last = std::prev(children_.end());
   if (Internals::Usable(*this) && storage_.index->HasRoom()) {
-    storage_.index->Enter(last);
-    last->parent_index_ = storage_.index;
+    storage_.index->Enter(last, Hash(last->name_));
+    Internals::SetParentIndex(*last, storage_.index);
   } else if (children_.size() >= Internals::kIndexThreshold) {
     Internals::BuildIndex(*this);
   }
@@ -419,8 +403,8 @@ Property& Property::AdoptLast() noexcept {
 }
 
 bool Property::operator==(const Property& other) const noexcept {
-  if (type_ != other.type_ || name_hash_ != other.name_hash_ || name_ != other.name_) return false;
-  switch (type_) {
+  if (GetType() != other.GetType() || name_ != other.name_) return false;
+  switch (GetType()) {
     case PropertyTypeBool:
       return storage_.flag == other.storage_.flag;
     case PropertyTypeInt64:
