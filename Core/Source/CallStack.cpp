@@ -6,9 +6,11 @@
 // information is read. A frame's offset is that of the byte before its return address, inside
 // the call instruction, so that `addr2line -f -C -e <module> <offset>` names the calling line.
 //
-// Frames in the C and C++ runtime libraries (program and thread start-up) are given by module and
-// offset only: the loader finds a symbol by walking the module's whole symbol table, thousands of
-// entries there, which would cost more than all the rest of an error.
+// Symbols are looked up only in the shared libraries other than the C and C++ runtime: the loader
+// finds a symbol by walking the module's whole table of exported symbols. The runtime libraries
+// export thousands, and so does a program built with a sanitizer or linked with its symbols
+// exported, while an ordinary program exports none of its functions; frames there are given by
+// module and offset, which would otherwise cost more than all the rest of an error.
 #include <Tarvek/Core/Interfaces/CallStack.h>
 
 #include <boost/core/demangle.hpp>
@@ -46,13 +48,15 @@ const char* BaseName(const char* path) {
   return slash == nullptr ? path : slash + 1;
 }
 
-// Whether a module is the C or C++ runtime library, by its file name.
-bool IsRuntime(const char* path) {
+// Whether the loader is asked for symbols in a module: not in the program (whose path the loader
+// gives as empty) nor in the C or C++ runtime library, known by its file name.
+bool LookUpSymbols(const char* path) {
+  if (path[0] == '\0') return false;
   const char* const name = BaseName(path);
   for (const char* runtime : {"libc.so", "libstdc++.so", "libc++.so", "libgcc_s.so", "ld-"}) {
-    if (std::strncmp(name, runtime, std::strlen(runtime)) == 0) return true;
+    if (std::strncmp(name, runtime, std::strlen(runtime)) == 0) return false;
   }
-  return false;
+  return true;
 }
 
 // The loaded module holding an address: its file name and load address.
@@ -87,17 +91,13 @@ void AppendFrame(std::string& out, const boost::stacktrace::frame& frame) {
     AppendHex(out, address);
     return;
   }
-  const char* path = module.path;
+  const char* const path = module.path;
   Dl_info info{};
-  if (!IsRuntime(path) && dladdr(reinterpret_cast<void*>(module.address), &info) != 0) {
-    if (info.dli_sname != nullptr) {
-      out += boost::core::demangle(info.dli_sname);
-      out += '+';
-      AppendHex(out, module.address - reinterpret_cast<std::uintptr_t>(info.dli_saddr));
-    } else {
-      out += "??";
-    }
-    if (path[0] == '\0' && info.dli_fname != nullptr) path = info.dli_fname;  // the program
+  if (LookUpSymbols(path) && dladdr(reinterpret_cast<void*>(module.address), &info) != 0 &&
+      info.dli_sname != nullptr) {
+    out += boost::core::demangle(info.dli_sname);
+    out += '+';
+    AppendHex(out, module.address - reinterpret_cast<std::uintptr_t>(info.dli_saddr));
   } else {
     out += "??";
   }
