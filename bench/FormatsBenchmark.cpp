@@ -8,6 +8,7 @@
 #include <boost/property_tree/ptree.hpp>
 
 #include <atomic>
+#include <chrono>
 #include <cstddef>
 #include <cstdio>
 #include <cstdlib>
@@ -219,6 +220,28 @@ void TarvekDefaultBitrate(benchmark::State& state) {
   AllocationsPerIteration allocations;
   for (auto _ : state) benchmark::DoNotOptimize(Tarvek::Conf::GetDefaultVideoBitrate(video));
   allocations.Report(state);
+}
+
+// A bitrate function refusing a description of another kind: the error is built with its call
+// stack, thrown and caught. The first throw of the process is timed apart (first_throw_us): it
+// pays once for what the unwinder and the loader set up.
+void TarvekBitrateError(benchmark::State& state) {
+  const boost::intrusive_ptr<const IFormatCodec> audio = Tarvek::Conf::FormatCodecAudio::Create();
+  const auto refuse = [&audio] {
+    try {
+      benchmark::DoNotOptimize(Tarvek::Conf::GetDefaultVideoBitrate(audio));
+    } catch (const Tarvek::Conf::ConfException& error) {
+      benchmark::DoNotOptimize(&error);
+    }
+  };
+  static const double first_throw_us = [&refuse] {
+    const auto start = std::chrono::steady_clock::now();
+    refuse();
+    return std::chrono::duration<double, std::micro>(std::chrono::steady_clock::now() - start)
+        .count();
+  }();
+  for (auto _ : state) refuse();
+  state.counters["first_throw_us"] = first_throw_us;
 }
 
 // Replacing a description's whole tree with that of a full description.
@@ -455,6 +478,7 @@ const bool kRegistered = [] {
   benchmark::RegisterBenchmark(Name("Tarvek", S::kCompare).c_str(), TarvekCompare);
   benchmark::RegisterBenchmark(Name("Tarvek", S::kCompatible).c_str(), TarvekCompatible);
   benchmark::RegisterBenchmark("Tarvek/default_bitrate", TarvekDefaultBitrate);
+  benchmark::RegisterBenchmark("Tarvek/bitrate_error", TarvekBitrateError);
   benchmark::RegisterBenchmark("Tarvek/set_property", TarvekSetProperty);
   benchmark::RegisterBenchmark("Tarvek/print_content", TarvekPrintContent);
   benchmark::RegisterBenchmark("Tarvek/heap_of_one_description", TarvekHeapOfOneDescription)

@@ -20,17 +20,17 @@
 // an empty container child when the name is missing, so use it only to write.
 // Assignment. Assigning a Property copies type, value and children but keeps the target's name,
 // so a sub-tree can be replaced under its key; moving takes the name too. Assigning a plain value
-// turns the node into a leaf and drops its children.
+// turns the node into a leaf and drops its children. Moving a property into a child, or out of
+// one, renames that child in place; look-ups find it under its new name straight away.
 // Errors. Adding a child to a leaf throws MethodIsNotApplicable, and nothing changes. Every error
 // derives from Tarvek::Core::PropertyException; boost::diagnostic_information() prints its items,
-// the call stack and the throw location. Threads: a tree is a plain value; any number of threads
-// may read one that nobody writes; writers need a lock of the caller's.
+// the call stack and the throw location.
+// Threads. A tree is a plain value: any number of threads may read one that nobody writes (a
+// look-up writes nothing, not even to a cache); writers need a lock of the caller's.
 #ifndef TARVEK_CORE_INTERFACES_PROPERTY_H_
 #define TARVEK_CORE_INTERFACES_PROPERTY_H_
 
-#include <atomic>
 #include <cstdint>
-#include <cstring>
 #include <iosfwd>
 #include <list>
 #include <string>
@@ -50,6 +50,7 @@ class PropertyKey;
 /// Not synchronised: share a tree between threads only for reading.
 class TARVEK_CORE_API Property {
  public:
+  /// The children, in the order they were added, and iterators over them.
   using Children = std::list<Property>;
   using iterator = Children::iterator;
   using const_iterator = Children::const_iterator;
@@ -72,7 +73,9 @@ class TARVEK_CORE_API Property {
 
   /// Deep copy: name, type, value and all children.
   Property(const Property& other);
+  /// Takes `other`'s name, type, value and children; `other` is left an unnamed empty container.
   Property(Property&& other) noexcept;
+  /// Frees the value and the children.
   virtual ~Property();
 
   /// Takes `other`'s type, value and children and KEEPS this node's name, so a subtree can be
@@ -97,7 +100,7 @@ class TARVEK_CORE_API Property {
   /// The node's name.
   const std::string& GetName() const noexcept { return name_; }
   /// The node's type.
-  PropertyTypes GetType() const noexcept { return static_cast<PropertyTypes>(type_); }
+  PropertyTypes GetType() const noexcept { return static_cast<PropertyTypes>(link_ & kTypeBits); }
   /// The children, in the order they were added.
   const Children& GetChildren() const noexcept { return children_; }
 
@@ -152,27 +155,21 @@ class TARVEK_CORE_API Property {
 
  private:
   struct Internals;  // helpers with access to the members, in the library
-  // A container's index of its children by name (see Property.cpp); block null when none.
-  struct ChildIndex {
-    void* block;
-    std::uint32_t mask;   // slot count - 1
-    std::uint32_t names;  // distinct names indexed
-    std::uint64_t epoch;  // the rename epoch it was built in
-  };
-  // A leaf's value or a container's index; type_ tells which member lives.
+  class ChildIndex;  // a large container's index of its children by name, in the library
+  // A leaf's value or a container's index (null when it has none); the type tells which lives.
   union Storage {
-    Storage() noexcept : index{} {}
+    Storage() noexcept : index(nullptr) {}
     ~Storage() {}
     bool flag;
     long long integer;
     std::string text;
-    ChildIndex index;
+    ChildIndex* index;
   };
 
-  static std::atomic<std::uint64_t> rename_epoch_;  // see Property.cpp
   Property& AdoptLast() noexcept;  // indexes the child just appended and returns it
-  // The first child named `name` by walking the children, or their end.
-  const_iterator ScanChildren(const std::string& name, std::uint32_t hash) const noexcept;
+  // The first child named like `key` in a container with an index; a walk of the children while
+  // the index waits to be rebuilt after a child was renamed in place.
+  const_iterator FindIndexed(const PropertyKey& key) const noexcept;
   // The refusal of the child helpers, with the items naming this node and `method` attached.
   MethodIsNotApplicable NotApplicableError(const char* method) const;
   [[noreturn]] void ThrowNotApplicable(const char* method, int line, const char* function) const;
@@ -183,9 +180,12 @@ class TARVEK_CORE_API Property {
 
   std::string name_;
   Storage storage_;
-  std::uint32_t name_hash_;  // a hash of name_, compared before the texts
-  unsigned char type_;       // a PropertyTypes value
-  bool indexed_;             // whether the parent's index counts this node
+  // One word for two things, to keep nodes small: the type (a PropertyTypes value) in the low
+  // three bits, and the address of the parent's index, when the parent has one, in the others (an
+  // index is 8-aligned). A child renamed in place marks that index stale, so no look-up answers
+  // wrongly and nothing outside the tree is written.
+  std::uintptr_t link_;
+  static constexpr std::uintptr_t kTypeBits = 7;  // the bits of link_ that hold the type
   Children children_;
 };
 
@@ -267,19 +267,19 @@ Property& Property::SetChildT(const std::string& name, const T& value) {
 
 // The typed getters are inline: a read is a type test and a load.
 inline bool Property::GetBool() const {
-  if (type_ == PropertyTypeBool) return storage_.flag;
+  if (GetType() == PropertyTypeBool) return storage_.flag;
   ThrowWrongType(PropertyTypeBool, "GetBool", Detail::kPropertyHeader, __LINE__,
                  BOOST_CURRENT_FUNCTION);
 }
 
 inline long long Property::GetInt64() const {
-  if (type_ == PropertyTypeInt64) return storage_.integer;
+  if (GetType() == PropertyTypeInt64) return storage_.integer;
   ThrowWrongType(PropertyTypeInt64, "GetInt64", Detail::kPropertyHeader, __LINE__,
                  BOOST_CURRENT_FUNCTION);
 }
 
 inline const std::string& Property::GetString() const {
-  if (type_ == PropertyTypeString) return storage_.text;
+  if (GetType() == PropertyTypeString) return storage_.text;
   ThrowWrongType(PropertyTypeString, "GetString", Detail::kPropertyHeader, __LINE__,
                  BOOST_CURRENT_FUNCTION);
 }
@@ -299,57 +299,14 @@ class TARVEK_CORE_API PropertyKey {
   std::uint32_t hash_;
 };
 
-namespace Detail {
-
-// The index of a container's children (see Property.cpp): `mask` + 1 list iterators, then as many
-// control bytes, 0 for an empty slot, else 0x80 and the top seven bits of the name's hash.
-inline const Property::iterator* IndexSlots(const void* block) noexcept {
-  return static_cast<const Property::iterator*>(block);
-}
-inline const unsigned char* IndexControl(const void* block, std::uint32_t mask) noexcept {
-  return reinterpret_cast<const unsigned char*>(IndexSlots(block) + mask + 1);
-}
-inline unsigned char IndexTag(std::uint32_t hash) noexcept {
-  return static_cast<unsigned char>(0x80u | (hash >> 25));
-}
-
-// Text equality without a library call for names of 4 to 16 bytes, the usual ones.
-inline bool SameName(const std::string& a, const std::string& b) noexcept {
-  const std::size_t size = a.size();
-  if (size != b.size()) return false;
-  const char* x = a.data();
-  const char* y = b.data();
-  const auto same = [x, y](std::size_t at, auto word) {
-    std::memcpy(&word, x + at, sizeof word);
-    decltype(word) other;
-    std::memcpy(&other, y + at, sizeof other);
-    return word == other;
-  };
-  if (size >= 8 && size <= 16) return same(0, std::uint64_t{}) && same(size - 8, std::uint64_t{});
-  if (size >= 4 && size < 8) return same(0, std::uint32_t{}) && same(size - 4, std::uint32_t{});
-  return std::memcmp(x, y, size) == 0;
-}
-
-}  // namespace Detail
-
-// Look-ups by key are inline: with an index, a probe or two and one comparison of the name;
-// without one (small containers, or an index from before a rename), a walk in the library.
+// Look-ups by key are inline where a container has no index: a walk that compares the names. A
+// container with an index answers in one call into the library.
 inline Property::const_iterator Property::FindChild(const PropertyKey& key) const noexcept {
-  const ChildIndex& index = storage_.index;
-  if (type_ == PropertyTypeContainer && index.block != nullptr &&
-      index.epoch == rename_epoch_.load(std::memory_order_relaxed)) {
-    const iterator* const slots = Detail::IndexSlots(index.block);
-    const unsigned char* const control = Detail::IndexControl(index.block, index.mask);
-    const unsigned char tag = Detail::IndexTag(key.hash_);
-    for (std::uint32_t i = key.hash_ & index.mask;; i = (i + 1) & index.mask) {
-      if (control[i] == 0) return children_.end();
-      if (control[i] == tag && slots[i]->name_hash_ == key.hash_ &&
-          Detail::SameName(slots[i]->name_, key.name_)) {
-        return slots[i];
-      }
-    }
+  if (GetType() == PropertyTypeContainer && storage_.index != nullptr) return FindIndexed(key);
+  for (const_iterator it = children_.begin(); it != children_.end(); ++it) {
+    if (it->name_ == key.name_) return it;
   }
-  return ScanChildren(key.name_, key.hash_);
+  return children_.end();
 }
 
 inline bool Property::ChildExists(const PropertyKey& key) const noexcept {

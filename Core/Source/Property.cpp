@@ -1,13 +1,13 @@
 // The core property library: Tarvek::Core::Property.
 #include <Tarvek/Core/Interfaces/Property.h>
 
-#include <atomic>
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
-#include <new>
-#include <type_traits>
+#include <string>
 #include <utility>
+
+#include "ChildIndex.h"
 
 namespace Tarvek {
 
@@ -86,136 +86,87 @@ std::uint32_t Hash(const std::string& name) noexcept {
 
 }  // namespace
 
-// Look-up by name. Every node keeps a 32-bit hash of its name, so a scan of the children compares
-// texts only where the hashes agree. A container with kIndexThreshold children or more also keeps
-// an index: an open-addressing table (linear probing, at most three quarters full) of iterators to
-// its children, with one control byte a slot: 0 for an empty slot, else 0x80 and the top seven
-// bits of the name's hash. Only the first child of each name is entered, so a look-up still gives
-// the first child of a name. List iterators stay valid while other children come and go and when
-// the list is swapped, so the index moves with the children it describes.
+// Look-up by name. A container with kIndexThreshold children or more keeps an index of them by a
+// hash of their names (ChildIndex.h); a smaller one is scanned, comparing lengths first.
 //
 // Renames. An index finds a child under the name it had when it was entered. A node that is a
-// child can be renamed in place only by moving into it or out of it; when that happens to a child
-// an index counts (indexed_), a process-wide rename epoch advances, and every index built in an
-// earlier epoch is no longer trusted: look-ups in its container scan until the next append
-// rebuilds it. Renaming children in place is rare, so this costs nothing in practice, and no
-// look-up ever gives a wrong answer. Readers only read the epoch, so trees shared for reading
-// stay safe to read from any number of threads.
+// child can be renamed in place only by moving into it or out of it. Every child of an indexed
+// container points to that index (in link_), and a renamed child marks it stale: look-ups in
+// that container then scan until the next append rebuilds the index. Renaming children in place is
+// rare, so this costs nothing in practice; no look-up ever gives a wrong answer, and look-ups write
+// nothing, so trees shared for reading stay safe to read from any number of threads.
+// Invariant: a child's parent index is null or its parent's current index. Only BuildIndex
+// replaces an index while the children live on, and it updates them all.
 //
 // The index is a cache: when its block cannot be allocated there is none, and look-ups scan.
 // Building it never throws.
 struct Property::Internals {
   static constexpr std::size_t kIndexThreshold = 8;
-  static constexpr std::uint32_t kFirstSlots = 32;
 
-  static_assert(std::is_trivially_copyable_v<iterator> &&
-                    std::is_trivially_destructible_v<iterator>,
-                "index slots are raw copies of list iterators");
-  static_assert(alignof(iterator) <= __STDCPP_DEFAULT_NEW_ALIGNMENT__,
-                "index blocks come from operator new");
-
-  static std::uint64_t Epoch() noexcept { return rename_epoch_.load(std::memory_order_relaxed); }
-  static void NoteRename() noexcept { rename_epoch_.fetch_add(1, std::memory_order_relaxed); }
-
-  static bool HasName(const Property& node, const std::string& key, std::uint32_t hash) noexcept {
-    return node.name_hash_ == hash && Detail::SameName(node.name_, key);
+  static ChildIndex* ParentIndex(const Property& node) noexcept {
+    return reinterpret_cast<ChildIndex*>(node.link_ & ~kTypeBits);
+  }
+  static void SetParentIndex(Property& node, ChildIndex* index) noexcept {
+    node.link_ = reinterpret_cast<std::uintptr_t>(index) | (node.link_ & kTypeBits);
+  }
+  static void SetType(Property& node, PropertyTypes type) noexcept {
+    node.link_ = (node.link_ & ~kTypeBits) | static_cast<std::uintptr_t>(type);
   }
 
-  // The index's slots and control bytes, laid out as the inline look-ups in the header read them.
-  static unsigned char Tag(std::uint32_t hash) noexcept { return Detail::IndexTag(hash); }
-  static iterator* Slots(const ChildIndex& index) noexcept {
-    return const_cast<iterator*>(Detail::IndexSlots(index.block));
-  }
-  static unsigned char* Control(const ChildIndex& index) noexcept {
-    return const_cast<unsigned char*>(Detail::IndexControl(index.block, index.mask));
-  }
   static bool Usable(const Property& node) noexcept {
-    return node.type_ == PropertyTypeContainer && node.storage_.index.block != nullptr &&
-           node.storage_.index.epoch == Epoch();
-  }
-  // Whether one more name fits without the table passing three quarters full.
-  static bool HasRoom(const ChildIndex& index) noexcept {
-    return (std::uint64_t{index.names} + 1) * 4 <= (std::uint64_t{index.mask} + 1) * 3;
+    return node.GetType() == PropertyTypeContainer && node.storage_.index != nullptr &&
+           !node.storage_.index->Stale();
   }
 
   // The first child of `self` named `key`, or the end of its children.
   template <class Self>
   static auto Find(Self& self, const std::string& key) noexcept -> decltype(self.children_.end()) {
-    if (self.children_.empty()) return self.children_.end();
-    return Find(self, key, Hash(key));
+    if (Usable(self)) return self.storage_.index->Find(key, Hash(key), self.children_.end());
+    return Scan(self, key);
   }
 
-  // The same, with the hash of `key` already worked out.
+  // The first child of `self` named `key` by walking the children, or their end.
   template <class Self>
-  static auto Find(Self& self, const std::string& key, std::uint32_t hash) noexcept
-      -> decltype(self.children_.end()) {
-    if (Usable(self)) {
-      const ChildIndex& index = self.storage_.index;
-      const unsigned char tag = Tag(hash);
-      const unsigned char* const control = Control(index);
-      for (std::uint32_t i = hash & index.mask;; i = (i + 1) & index.mask) {
-        if (control[i] == 0) return self.children_.end();
-        if (control[i] == tag && HasName(*Slots(index)[i], key, hash)) return Slots(index)[i];
-      }
-    }
+  static auto Scan(Self& self, const std::string& key) noexcept -> decltype(self.children_.end()) {
     for (auto it = self.children_.begin(); it != self.children_.end(); ++it) {
-      if (HasName(*it, key, hash)) return it;
+      if (Detail::SameName(it->name_, key)) return it;
     }
     return self.children_.end();
   }
 
-  // Enters `child` unless an earlier child has its name. The table has room.
-  static void Enter(ChildIndex& index, iterator child) noexcept {
-    const std::uint32_t hash = child->name_hash_;
-    const unsigned char tag = Tag(hash);
-    unsigned char* const control = Control(index);
-    for (std::uint32_t i = hash & index.mask;; i = (i + 1) & index.mask) {
-      if (control[i] == 0) {
-        control[i] = tag;
-        new (Slots(index) + i) iterator(child);
-        ++index.names;
-        return;
-      }
-      if (control[i] == tag && HasName(*Slots(index)[i], child->name_, hash)) return;
-    }
-  }
-
-  static void DropIndex(Property& node) noexcept {
-    ::operator delete(node.storage_.index.block);
-    node.storage_.index = ChildIndex{};
-  }
-
   // (Re)builds the index of a container from its children, or leaves it without one when it has
-  // too few children or the block cannot be had.
+  // too few children or the block cannot be had; either way every child points to what is left.
   static void BuildIndex(Property& node) noexcept {
-    DropIndex(node);
     const std::size_t count = node.children_.size();
-    if (count < kIndexThreshold || count > (std::size_t{1} << 28)) return;
-    std::uint64_t slots = kFirstSlots;
-    while ((count + 1) * 4 > slots * 3) slots *= 2;
-    const std::uint64_t bytes = slots * (sizeof(iterator) + 1);  // the slots, then their control
-    void* const block = ::operator new(bytes, std::nothrow);
-    if (block == nullptr) return;
-    ChildIndex index{block, static_cast<std::uint32_t>(slots - 1), 0, Epoch()};
-    std::memset(Control(index), 0, slots);
-    for (auto it = node.children_.begin(); it != node.children_.end(); ++it) {
-      Enter(index, it);
-      it->indexed_ = true;
-    }
+    ChildIndex* const index = count >= kIndexThreshold && count <= (std::size_t{1} << 28)
+                                  ? ChildIndex::Create(count)
+                                  : nullptr;
+    const bool had = node.storage_.index != nullptr;
+    ChildIndex::Destroy(node.storage_.index);
     node.storage_.index = index;
+    if (index == nullptr && !had) return;  // no child points to an index
+    for (auto it = node.children_.begin(); it != node.children_.end(); ++it) {
+      if (index != nullptr) index->Enter(it, Hash(it->name_));
+      SetParentIndex(*it, index);
+    }
+  }
+
+  // Tells the parent's index, if any, that `node` has a new name.
+  static void NoteRename(const Property& node) noexcept {
+    ChildIndex* const parent = ParentIndex(node);
+    if (parent != nullptr) parent->MarkStale();
   }
 
   // Frees what the storage holds (a string or an index); the node is then a container without an
-  // index, its children untouched.
+  // index, its children untouched: they must be dropped next (Clear, or the destructor).
   static void Release(Property& node) noexcept {
-    if (node.type_ == PropertyTypeString) {
+    if (node.GetType() == PropertyTypeString) {
       node.storage_.text.~basic_string();
-      new (&node.storage_.index) ChildIndex{};
-    } else if (node.type_ == PropertyTypeContainer) {
-      DropIndex(node);
+    } else if (node.GetType() == PropertyTypeContainer) {
+      ChildIndex::Destroy(node.storage_.index);
     }
-    node.type_ = PropertyTypeContainer;
-    node.storage_.index = ChildIndex{};
+    SetType(node, PropertyTypeContainer);
+    node.storage_.index = nullptr;
   }
 
   // Empties `node`: no value, no children, no index; its name and place stay.
@@ -234,7 +185,7 @@ struct Property::Internals {
   // Copies `from`'s value into `to`, which holds nothing. A container copies no index: `to`
   // builds its own over its own children. On failure `to` still holds nothing.
   static void CopyValue(Property& to, const Property& from) {
-    switch (from.type_) {
+    switch (from.GetType()) {
       case PropertyTypeBool:
         to.storage_.flag = from.storage_.flag;
         break;
@@ -247,12 +198,12 @@ struct Property::Internals {
       default:
         return;
     }
-    to.type_ = from.type_;
+    SetType(to, from.GetType());
   }
 
   // Moves `from`'s value or index into `to`, which holds nothing; `from` then holds nothing.
   static void MoveValue(Property& to, Property& from) noexcept {
-    switch (from.type_) {
+    switch (from.GetType()) {
       case PropertyTypeBool:
         to.storage_.flag = from.storage_.flag;
         break;
@@ -267,12 +218,12 @@ struct Property::Internals {
         to.storage_.index = from.storage_.index;
         break;
     }
-    to.type_ = from.type_;
-    from.type_ = PropertyTypeContainer;
-    new (&from.storage_.index) ChildIndex{};
+    SetType(to, from.GetType());
+    SetType(from, PropertyTypeContainer);
+    from.storage_.index = nullptr;
   }
 
-  // Exchanges value (or index) and children; names, hashes and places stay.
+  // Exchanges value (or index) and children; names and places stay.
   static void SwapContent(Property& a, Property& b) noexcept {
     Property held{std::string()};
     MoveValue(held, a);
@@ -281,28 +232,24 @@ struct Property::Internals {
     a.children_.swap(b.children_);
   }
 
-  static void Rename(Property& node, const std::string& name) {
-    node.name_ = name;
-    node.name_hash_ = Hash(node.name_);
-  }
+  static void Rename(Property& node, const std::string& name) { node.name_ = name; }
 };
 
-Property::Property(const std::string& name)
-    : name_(name), name_hash_(Hash(name)), type_(PropertyTypeContainer), indexed_(false) {}
+Property::Property(const std::string& name) : name_(name), link_(PropertyTypeContainer) {}
 
 Property::Property(const std::string& name, bool value) : Property(name) {
   storage_.flag = value;
-  type_ = PropertyTypeBool;
+  Internals::SetType(*this, PropertyTypeBool);
 }
 
 Property::Property(const std::string& name, long long value) : Property(name) {
   storage_.integer = value;
-  type_ = PropertyTypeInt64;
+  Internals::SetType(*this, PropertyTypeInt64);
 }
 
 Property::Property(const std::string& name, const std::string& value) : Property(name) {
   Internals::PlaceText(*this, std::string(value));
-  type_ = PropertyTypeString;
+  Internals::SetType(*this, PropertyTypeString);
 }
 
 Property::Property(const std::string& name, const char* value)
@@ -311,26 +258,18 @@ Property::Property(const std::string& name, const char* value)
 // The value is copied last, in the body: if it throws, the members built so far are destroyed and
 // the storage holds nothing that would need freeing.
 Property::Property(const Property& other)
-    : name_(other.name_),
-      name_hash_(other.name_hash_),
-      type_(PropertyTypeContainer),
-      indexed_(false),
-      children_(other.children_) {
+    : name_(other.name_), link_(PropertyTypeContainer), children_(other.children_) {
   Internals::CopyValue(*this, other);
-  if (type_ == PropertyTypeContainer) Internals::BuildIndex(*this);
+  if (GetType() == PropertyTypeContainer) Internals::BuildIndex(*this);
 }
 
 Property::Property(Property&& other) noexcept
-    : name_(std::move(other.name_)),
-      name_hash_(other.name_hash_),
-      type_(PropertyTypeContainer),
-      indexed_(false) {
+    : name_(std::move(other.name_)), link_(PropertyTypeContainer) {
   // Swapped, not moved: a swap keeps iterators to the elements valid, so the index stays good.
   children_.swap(other.children_);
   Internals::MoveValue(*this, other);
   other.name_.clear();
-  other.name_hash_ = Hash(other.name_);
-  if (other.indexed_) Internals::NoteRename();
+  if (!name_.empty()) Internals::NoteRename(other);
 }
 
 Property::~Property() { Internals::Release(*this); }
@@ -342,7 +281,7 @@ Property& Property::operator=(const Property& other) {
   copy.children_ = other.children_;
   Internals::CopyValue(copy, other);
   Internals::SwapContent(*this, copy);
-  if (type_ == PropertyTypeContainer) Internals::BuildIndex(*this);
+  if (GetType() == PropertyTypeContainer) Internals::BuildIndex(*this);
   return *this;
 }
 
@@ -350,9 +289,8 @@ Property& Property::operator=(Property&& other) noexcept {
   if (this == &other) return *this;
   // Detach `other`'s content before dropping ours: `other` may live inside our children.
   Property taken(std::move(other));
-  if (indexed_ && taken.name_ != name_) Internals::NoteRename();
+  if (taken.name_ != name_) Internals::NoteRename(*this);
   name_.swap(taken.name_);
-  std::swap(name_hash_, taken.name_hash_);
   Internals::SwapContent(*this, taken);
   return *this;
 }
@@ -360,20 +298,20 @@ Property& Property::operator=(Property&& other) noexcept {
 Property& Property::operator=(bool value) {
   Internals::Clear(*this);
   storage_.flag = value;
-  type_ = PropertyTypeBool;
+  Internals::SetType(*this, PropertyTypeBool);
   return *this;
 }
 
 Property& Property::operator=(long long value) {
   Internals::Clear(*this);
   storage_.integer = value;
-  type_ = PropertyTypeInt64;
+  Internals::SetType(*this, PropertyTypeInt64);
   return *this;
 }
 
 Property& Property::operator=(const std::string& value) {
   // A string leaf reuses its buffer; assignment leaves it as it was if it throws.
-  if (type_ == PropertyTypeString) {
+  if (GetType() == PropertyTypeString) {
     storage_.text = value;
     return *this;
   }
@@ -381,7 +319,7 @@ Property& Property::operator=(const std::string& value) {
   std::string copy(value);
   Internals::Clear(*this);
   Internals::PlaceText(*this, std::move(copy));
-  type_ = PropertyTypeString;
+  Internals::SetType(*this, PropertyTypeString);
   return *this;
 }
 
@@ -407,22 +345,20 @@ const Property& Property::operator[](const std::string& key) const {
   return *found;
 }
 
-Property::const_iterator Property::ScanChildren(const std::string& name,
-                                                std::uint32_t hash) const noexcept {
-  for (auto it = children_.begin(); it != children_.end(); ++it) {
-    if (Internals::HasName(*it, name, hash)) return it;
-  }
-  return children_.end();
+// Called by the inline look-ups for containers with an index only, so kept lean: the probe, and
+// the walk only while the index is stale.
+Property::const_iterator Property::FindIndexed(const PropertyKey& key) const noexcept {
+  const ChildIndex* const index = storage_.index;
+  if (index->Stale()) return Internals::Scan(*this, key.name_);
+  return index->Find(key.name_, key.hash_, children_.end());
 }
-
-std::atomic<std::uint64_t> Property::rename_epoch_{0};
 
 PropertyKey::PropertyKey(const std::string& name) : name_(name), hash_(Hash(name)) {}
 
 Property& Property::operator[](const std::string& key) {
   const iterator found = Internals::Find(*this, key);
   if (found != children_.end()) return *found;
-  if (type_ != PropertyTypeContainer) {
+  if (GetType() != PropertyTypeContainer) {
     ThrowNotApplicable("operator[]", __LINE__, BOOST_CURRENT_FUNCTION);
   }
   children_.emplace_back(key);
@@ -430,7 +366,7 @@ Property& Property::operator[](const std::string& key) {
 }
 
 Property& Property::SetChild(const std::string& key) {
-  if (type_ != PropertyTypeContainer) {
+  if (GetType() != PropertyTypeContainer) {
     ThrowNotApplicable("SetChild", __LINE__, BOOST_CURRENT_FUNCTION);
   }
   const iterator found = Internals::Find(*this, key);
@@ -443,7 +379,7 @@ Property& Property::SetChild(const std::string& key) {
 }
 
 Property& Property::SetChild(const std::string& key, const Property& value) {
-  if (type_ != PropertyTypeContainer) {
+  if (GetType() != PropertyTypeContainer) {
     ThrowNotApplicable("SetChild", __LINE__, BOOST_CURRENT_FUNCTION);
   }
   const iterator found = Internals::Find(*this, key);
@@ -457,10 +393,9 @@ Property& Property::SetChild(const std::string& key, const Property& value) {
 
 Property& Property::AdoptLast() noexcept {
   const iterator last = std::prev(children_.end());
-  ChildIndex& index = storage_.index;
-  if (Internals::Usable(*this) && Internals::HasRoom(index)) {
-    Internals::Enter(index, last);
-    last->indexed_ = true;
+  if (Internals::Usable(*this) && storage_.index->HasRoom()) {
+    storage_.index->Enter(last, Hash(last->name_));
+    Internals::SetParentIndex(*last, storage_.index);
   } else if (children_.size() >= Internals::kIndexThreshold) {
     Internals::BuildIndex(*this);
   }
@@ -468,8 +403,8 @@ Property& Property::AdoptLast() noexcept {
 }
 
 bool Property::operator==(const Property& other) const noexcept {
-  if (type_ != other.type_ || name_hash_ != other.name_hash_ || name_ != other.name_) return false;
-  switch (type_) {
+  if (GetType() != other.GetType() || name_ != other.name_) return false;
+  switch (GetType()) {
     case PropertyTypeBool:
       return storage_.flag == other.storage_.flag;
     case PropertyTypeInt64:

@@ -5,6 +5,8 @@
 #include <boost/exception_ptr.hpp>
 #include <exception>
 #include <functional>
+#include <regex>
+#include <sstream>
 #include <string>
 
 #include <Tarvek/Formats.h>
@@ -108,9 +110,24 @@ TEST(ErrorsTest, CurrentExceptionCapturesThrownError) {
   EXPECT_EQ(ItemOf<PropertyException::MethodNameInfo>(*error), "CreateChildT");
 }
 
-TEST(ErrorsTest, GetCallStackNamesTheCaller) {
-  const std::string stack = Tarvek::GetCallStack();
-  EXPECT_NE(stack.find("GetCallStackNamesTheCaller"), std::string::npos) << stack;
+// One line a frame, "N# symbol+0x.. in module+0x..", the symbol "??" where none is looked up;
+// the library function the error came through is named where a shared library exports it, and
+// linked into the program it shows as a frame of the program.
+TEST(ErrorsTest, CallStackNamesModulesOffsetsAndExportedFunctions) {
+  const auto error = CatchAs<Tarvek::Conf::ConfException>(
+      [] { Tarvek::Conf::GetDefaultVideoBitrate(Tarvek::Conf::FormatCodecAudio::Create()); });
+  ASSERT_TRUE(error);
+  const std::string stack = ItemOf<Tarvek::CallStackInfo>(*error).value_or("");
+  const char* const caller =
+      TARVEK_TEST_SHARED_LIBS ? " Tarvek::Conf::GetDefaultVideoBitrate(" : "?? in <program>+0x";
+  EXPECT_NE(stack.find(caller), std::string::npos) << stack;
+  const std::regex frame(R"( ?\d+# (\?\?|\S.*\+0x[0-9a-f]+) in [^ /]+\+0x[0-9a-f]+)");
+  std::istringstream lines(stack);
+  int count = 0;
+  for (std::string line; std::getline(lines, line); ++count) {
+    EXPECT_TRUE(std::regex_match(line, frame)) << line;
+  }
+  EXPECT_GE(count, 3) << stack;
 }
 
 }  // namespace
