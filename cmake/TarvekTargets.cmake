@@ -61,7 +61,8 @@ endfunction()
 
 # tarvek_install_library(<target> HEADERS_TO <folder under include/Tarvek> [HEADERS files...]
 #                        [COMPONENT <name>] DESCRIPTION <text> [REQUIRES modules...]
-#                        [REQUIRES_PRIVATE modules...] [LIBS_PRIVATE flags...])
+#                        [REQUIRES_PRIVATE modules...] [LIBS_PRIVATE flags...]
+#                        [CFLAGS flags...])
 # Installs the library, its public headers, and a pkg-config file named after its output name. A
 # library of a component goes to the export set Tarvek<component>Targets, read by the package
 # configuration only when that component is asked for.
@@ -70,7 +71,7 @@ function(tarvek_install_library target)
     return()
   endif()
   cmake_parse_arguments(arg "" "HEADERS_TO;COMPONENT;DESCRIPTION"
-                        "HEADERS;REQUIRES;REQUIRES_PRIVATE;LIBS_PRIVATE" ${ARGN})
+                        "HEADERS;REQUIRES;REQUIRES_PRIVATE;LIBS_PRIVATE;CFLAGS" ${ARGN})
   if(NOT arg_COMPONENT)
     set(arg_COMPONENT Formats)
   endif()
@@ -86,10 +87,13 @@ function(tarvek_install_library target)
   string(REPLACE ";" " " PC_REQUIRES "${arg_REQUIRES}")
   string(REPLACE ";" " " PC_REQUIRES_PRIVATE "${arg_REQUIRES_PRIVATE}")
   string(REPLACE ";" " " PC_LIBS_PRIVATE "${arg_LIBS_PRIVATE}")
-  set(PC_CFLAGS "")
+  string(REPLACE ";" " " PC_CFLAGS "${arg_CFLAGS}")
+  if(PC_CFLAGS)
+    set(PC_CFLAGS " ${PC_CFLAGS}")
+  endif()
   get_target_property(type ${target} TYPE)
   if(type STREQUAL "STATIC_LIBRARY")
-    set(PC_CFLAGS " -DTARVEK_STATIC")
+    string(APPEND PC_CFLAGS " -DTARVEK_STATIC")
   endif()
   file(RELATIVE_PATH PC_TO_PREFIX "/${CMAKE_INSTALL_LIBDIR}/pkgconfig" "/")
   string(REGEX REPLACE "/$" "" PC_TO_PREFIX "${PC_TO_PREFIX}")
