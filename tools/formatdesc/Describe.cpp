@@ -162,28 +162,29 @@ std::string FirstDifference(const Json& stored, const Json& derived, const std::
 
 // The description object a stream specifier picks out of a probe document's streams: an index
 // ("2"), or the n-th stream of a kind ("v:0", "a:1", "s:0").
-const Json& PickStream(const Json& streams, const std::optional<std::string>& spec,
+const Json& PickStream(const Json& streams, const std::optional<std::string>& specifier,
                        const std::string& path) {
   std::vector<const Json*> described;
   for (const Json& stream : streams) {
     if (stream.is_object() && stream.contains("description")) described.push_back(&stream);
   }
-  if (!spec) {
+  if (!specifier) {
     if (described.size() == 1) return (*described.front())["description"];
     throw UsageError("'" + path + "' holds " + std::to_string(described.size()) +
                      " described streams; pick one with --stream (2, v:0, a:1)");
   }
-  const std::size_t colon = spec->find(':');
-  const std::string kindLetter = colon == std::string::npos ? "" : spec->substr(0, colon);
+  const std::size_t colon = specifier->find(':');
+  const std::string kindLetter = colon == std::string::npos ? "" : specifier->substr(0, colon);
   const std::string kind = kindLetter == "v"   ? "video"
                            : kindLetter == "a" ? "audio"
                            : kindLetter == "s" ? "subtitle"
                                                : "";
   if (colon != std::string::npos && kind.empty()) {
-    throw BadValue("--stream", "a stream index (2) or a kind and an index (v:0, a:1, s:0)", *spec);
+    throw BadValue("--stream", "a stream index (2) or a kind and an index (v:0, a:1, s:0)",
+                   *specifier);
   }
   const long long wanted = ParseNonNegative(
-      "--stream", colon == std::string::npos ? *spec : spec->substr(colon + 1), 1 << 30);
+      "--stream", colon == std::string::npos ? *specifier : specifier->substr(colon + 1), 1 << 30);
   long long seen = 0;
   for (const Json& stream : streams) {
     if (!stream.is_object()) continue;
@@ -192,11 +193,12 @@ const Json& PickStream(const Json& streams, const std::optional<std::string>& sp
                            : stream.value("kind", std::string()) == kind && seen++ == wanted;
     if (!match) continue;
     if (!stream.contains("description")) {
-      throw UsageError("--stream: stream " + *spec + " of '" + path + "' holds no description");
+      throw UsageError("--stream: stream " + *specifier + " of '" + path +
+                       "' holds no description");
     }
     return stream["description"];
   }
-  throw UsageError("--stream: '" + path + "' has no stream " + *spec);
+  throw UsageError("--stream: '" + path + "' has no stream " + *specifier);
 }
 
 }  // namespace
