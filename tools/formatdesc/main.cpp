@@ -98,7 +98,7 @@ void AddSwitch(CLI::App& app, const std::string& name, std::optional<bool>& valu
 
 void AddCodecOptions(CLI::App& app, CodecArgs& args, const std::string& idHelp) {
   AddText(app, "--from-json", args.fromJson, kFromJsonHelp, "FILE");
-  AddText(app, "--stream", args.stream, kStreamHelp, "SPEC");
+  AddText(app, "--stream", args.stream, kStreamHelp, "STREAM");
   AddText(app, "--from-caps", args.fromCaps,
           "Start from the description that GStreamer caps give (as the summary's Caps line "
           "shows them); the options change it",
@@ -234,7 +234,7 @@ void AddDiff(CLI::App& app, DiffArgs& args) {
   diff->add_option("b", args.b, "The description compared with it")
       ->required()
       ->type_name("B.json");
-  AddText(*diff, "--stream", args.stream, kStreamHelp, "SPEC");
+  AddText(*diff, "--stream", args.stream, kStreamHelp, "STREAM");
   diff->add_flag("--json", args.json, "Print one JSON object instead of text");
   diff->footer(
       "Lists every setting that differs (only in a, only in b, other type, other value, other\n"
@@ -249,7 +249,7 @@ void AddValidate(CLI::App& app, ValidateArgs& args) {
   validate->add_option("file", args.file, "The description (as --json writes it)")
       ->required()
       ->type_name("FILE.json");
-  AddText(*validate, "--stream", args.stream, kStreamHelp, "SPEC");
+  AddText(*validate, "--stream", args.stream, kStreamHelp, "STREAM");
   validate->add_flag("--json", args.json, "Print one JSON object instead of text");
   validate->footer(
       "Prints one line a finding (error or warning) naming the setting, or 'valid'. Errors are\n"
