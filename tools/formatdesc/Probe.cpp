@@ -110,8 +110,10 @@ void Judge(StreamReport& report, const AVCodecParameters& parameters) {
       NoteUsualLayout(*audio, channels, report.notes);
     }
   } catch (const Tarvek::Conf::UnknownCodecError&) {
-    if (!report.uncompressed)
+    if (!report.uncompressed) {
       report.noVerdict = "no preset for codec " + Bridge::PresetCodecID(codec);
+      report.noVerdictResult = "no_preset";
+    }
     return;
   } catch (const Tarvek::Core::ChildNotFound& e) {
     const std::string* key = boost::get_error_info<Tarvek::Core::ChildNotFound::ChildNameInfo>(e);
@@ -125,6 +127,7 @@ void Judge(StreamReport& report, const AVCodecParameters& parameters) {
   }
   if (!codec.ExistsBitrate()) {
     report.noVerdict = "none (the file gives no bitrate for this stream)";
+    report.noVerdictResult = "no_bitrate";
     return;
   }
   if (lossless) {
@@ -273,15 +276,20 @@ nlohmann::ordered_json VerdictJson(const StreamReport& stream) {
                                  static_cast<double>(bitrate) * 100.0) /
                           100.0}};
   } else if (!stream.verdict) {
-    json = {{"result", "none"}, {"text", stream.noVerdict}};
+    json = {{"result", stream.noVerdictResult}, {"text", stream.noVerdict}};
   } else {
+    // Within the range no bound is passed: the distances do not apply.
     const Verdict& verdict = *stream.verdict;
+    const bool within = verdict.placement == Placement::Within;
+    const auto distance = [within](auto value) {
+      return within ? nlohmann::ordered_json() : nlohmann::ordered_json(value);
+    };
     json = {{"result", PlacementName(verdict.placement)},
             {"text", VerdictText(verdict)},
             {"bitrate", verdict.bitrate},
-            {"bound", verdict.bound},
-            {"difference", verdict.difference},
-            {"percent", std::round(verdict.percent * 100.0) / 100.0}};
+            {"bound", distance(verdict.bound)},
+            {"difference", distance(verdict.difference)},
+            {"percent", distance(std::round(verdict.percent * 100.0) / 100.0)}};
   }
   if (!stream.bitrateSource.empty()) json["bitrate_source"] = stream.bitrateSource;
   return json;

@@ -75,6 +75,8 @@ struct StreamReport {
   /// presets need that the file does not give, their refusal, or no bitrate in the file. Empty
   /// for other kinds.
   std::string noVerdict;
+  /// The JSON "result" that stands for it: "no_preset", "no_bitrate", or "none" for the others.
+  std::string noVerdictResult = "none";
 
   bool Skipped() const { return description == nullptr && damage.empty(); }
 };
