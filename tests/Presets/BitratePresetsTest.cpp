@@ -3,7 +3,6 @@
 // extreme inputs; and the errors for bad input.
 #include <Tarvek/Presets/BitratePresets.h>
 
-#include <algorithm>
 #include <cstdint>
 #include <functional>
 #include <limits>
@@ -77,7 +76,7 @@ class VideoPresetTest : public ::testing::TestWithParam<std::string> {};
 
 // Over the grid: min <= default <= max, and no figure falls as the picture grows or the frame
 // rate rises; no default rises with a higher quality number (from 0 up: -1 means none).
-TEST_P(VideoPresetTest, OrderedAndMonotonicOverTheGrid) {
+TEST_P(VideoPresetTest, OrderedMonotonicAndClamped) {
   const std::string& id = GetParam();
   for (std::size_t s = 0; s < kSizes.size(); ++s) {
     const auto& [w, h] = kSizes[s];
@@ -100,12 +99,8 @@ TEST_P(VideoPresetTest, OrderedAndMonotonicOverTheGrid) {
       }
     }
   }
-}
-
-// A frame rate of 0 is taken as 30; pictures, rates and qualities beyond the scales count as
-// their ends, and the figures stay far from overflow.
-TEST_P(VideoPresetTest, UnknownAndExtremeInputs) {
-  const std::string& id = GetParam();
+  // A frame rate of 0 is taken as 30; pictures, rates and qualities beyond the scales count as
+  // their ends, and the figures stay far from overflow.
   EXPECT_EQ(Video(id, 1920, 1080, 0.0, -1), Video(id, 1920, 1080, 30.0, -1));
   const int top = std::numeric_limits<int>::max();
   const Trio extreme = Video(id, 4294967295LL, 4294967295LL, 1e300, top);
@@ -119,33 +114,25 @@ INSTANTIATE_TEST_SUITE_P(AllVideoCodecs, VideoPresetTest,
                          ::testing::ValuesIn(GetPresetVideoCodecs()),
                          [](const auto& info) { return info.param; });
 
-class AudioPresetTest : public ::testing::TestWithParam<std::string> {
- protected:
-  // The channel counts 1..32 the codec carries; they must form one unbroken run.
-  std::vector<int> CarriedChannels() {
-    std::vector<int> carried;
-    for (int n = 1; n <= 32; ++n) {
-      try {
-        GetDefaultAudioBitrate(GetParam(), 48000, Channels(n), AV_SAMPLE_FMT_S16);
-        carried.push_back(n);
-      } catch (const InvalidPresetArgumentError&) {
-      }
-    }
-    EXPECT_FALSE(carried.empty());
-    if (!carried.empty()) {
-      EXPECT_EQ(carried.back() - carried.front() + 1, static_cast<int>(carried.size()));
-    }
-    return carried;
-  }
-};
+class AudioPresetTest : public ::testing::TestWithParam<std::string> {};
 
 const std::vector<long long> kSampleRates = {8000,  11025, 16000, 22050, 24000, 32000,
                                              44100, 48000, 88200, 96000, 192000};
 
 // Over the grid: min <= default <= max, and no figure falls with more channels or a higher
 // sample rate.
+// The channel counts 1..32 the codec carries form one unbroken run.
 TEST_P(AudioPresetTest, OrderedAndMonotonicOverTheGrid) {
-  const std::vector<int> carried = CarriedChannels();
+  std::vector<int> carried;
+  for (int n = 1; n <= 32; ++n) {
+    try {
+      GetDefaultAudioBitrate(GetParam(), 48000, Channels(n), AV_SAMPLE_FMT_S16);
+      carried.push_back(n);
+    } catch (const InvalidPresetArgumentError&) {
+    }
+  }
+  ASSERT_FALSE(carried.empty());
+  EXPECT_EQ(carried.back() - carried.front() + 1, static_cast<int>(carried.size()));
   for (std::size_t c = 0; c < carried.size(); ++c) {
     for (std::size_t r = 0; r < kSampleRates.size(); ++r) {
       const std::string where =
@@ -163,20 +150,6 @@ TEST_P(AudioPresetTest, OrderedAndMonotonicOverTheGrid) {
 INSTANTIATE_TEST_SUITE_P(AllAudioCodecs, AudioPresetTest,
                          ::testing::ValuesIn(GetPresetAudioCodecs()),
                          [](const auto& info) { return info.param; });
-
-TEST(BitratePresetsTest, CodecListsAreSortedAndCoverTheCommonCodecs) {
-  const auto& video = GetPresetVideoCodecs();
-  const auto& audio = GetPresetAudioCodecs();
-  EXPECT_TRUE(std::is_sorted(video.begin(), video.end()));
-  EXPECT_TRUE(std::is_sorted(audio.begin(), audio.end()));
-  for (const char* id : {"h264", "hevc", "vp9", "av1", "mpeg2video", "mpeg4", "prores", "dnxhd",
-                         "vp8", "mpeg1video", "mjpeg", "theora", "ffv1", "png"})
-    EXPECT_NE(std::find(video.begin(), video.end(), id), video.end()) << id;
-  for (const char* id :
-       {"aac", "mp3", "opus", "vorbis", "ac3", "eac3", "flac", "alac", "mp2", "dts", "truehd",
-        "pcm_s16le", "pcm_s24le", "pcm_f32le", "pcm_u8", "pcm_mulaw"})
-    EXPECT_NE(std::find(audio.begin(), audio.end(), id), audio.end()) << id;
-}
 
 TEST(BitratePresetsTest, VideoSpotValuesMatchThePublishedFigures) {
   EXPECT_EQ(GetDefaultVideoBitrate("h264", 1920, 1080, 30, -1), 8'000'000);   // YT-UP 1080p 8
