@@ -124,28 +124,6 @@ TEST(JsonForm, RoundTripIsExactForEveryKind) {
   EXPECT_THROW(ToJson(tooDeep), JsonFormError);
 }
 
-// The document's header, each value's type beside it, every bit of a 64-bit integer; unknown
-// top-level members (the tool's derived values) are ignored on reading.
-TEST(JsonForm, WritesTypedValuesAndIgnoresUnknownMembers) {
-  auto codec = FormatCodec::Create();
-  Core::Property tree = codec->GetProperty();
-  tree.CreateChildT<long long>("n", 1);
-  tree.CreateChildT<std::string>("n", "1");
-  tree.CreateChildT<long long>("min", kMin);
-  codec->SetProperty(tree);
-  Json document = Json::parse(ToJson(codec));
-  EXPECT_EQ(document["format"], "tarvek-description");
-  EXPECT_EQ(document["version"], kJsonFormVersion);
-  EXPECT_EQ(document["kind"], "codec");
-  const Json& children = document["tree"]["children"];
-  const std::size_t last = children.size() - 1;
-  EXPECT_EQ(children[last - 2], Json::parse(R"({"name": "n", "type": "int64", "value": 1})"));
-  EXPECT_EQ(children[last - 1], Json::parse(R"({"name": "n", "type": "string", "value": "1"})"));
-  EXPECT_EQ(children[last]["value"].get<long long>(), kMin);
-  document["bitrate"] = {{"default", 1}};
-  EXPECT_TRUE(FromJson(document.dump())->Compare(codec));
-}
-
 // A document of a small video, and the index of its child `name` in the tree.
 Json SmallVideo() {
   auto video = FormatCodecVideo::Create();
