@@ -2,8 +2,7 @@
 // other implementations: the codecs attribute libavformat's DASH muxer wrote into each manifest,
 // and GStreamer's gst_codec_utils_caps_get_mime_codec() on the stream's caps.
 #include <Tarvek/CodecString/CodecString.h>
-#include <Tarvek/Conf/Formats/FormatCodecAudio.h>
-#include <Tarvek/Conf/Formats/FormatCodecVideo.h>
+#include <Tarvek/FFmpeg/Streams.h>
 #include <Tarvek/GStreamer/Caps.h>
 #include <gst/pbutils/pbutils.h>
 #include <gtest/gtest.h>
@@ -32,7 +31,7 @@ std::string ReadFile(const fs::path& path) {
 }
 
 // The stream of a DASH folder as one file: its initialisation segment and its first media
-// segment, read by libavformat into a description.
+// segment, read by libavformat and described by the FFmpeg bridge.
 boost::intrusive_ptr<Conf::IFormatCodec> Describe(const fs::path& folder) {
   const std::string ext = fs::exists(folder / "init-stream0.webm") ? ".webm" : ".m4s";
   const fs::path whole = folder / ("whole" + ext);
@@ -41,28 +40,7 @@ boost::intrusive_ptr<Conf::IFormatCodec> Describe(const fs::path& folder) {
   AVFormatContext* input = nullptr;
   if (avformat_open_input(&input, whole.c_str(), nullptr, nullptr) < 0) return nullptr;
   avformat_find_stream_info(input, nullptr);
-  const AVStream* stream = input->streams[0];
-  const AVCodecParameters* par = stream->codecpar;
-  boost::intrusive_ptr<Conf::IFormatCodec> description;
-  if (par->codec_type == AVMEDIA_TYPE_VIDEO) {
-    auto video = Conf::FormatCodecVideo::Create();
-    video->InitByPixelAspect(static_cast<unsigned>(par->width), static_cast<unsigned>(par->height),
-                             1, 1);
-    video->SetFrameRate(static_cast<unsigned>(stream->avg_frame_rate.num),
-                        static_cast<unsigned>(stream->avg_frame_rate.den));
-    video->SetPixelFormat(static_cast<AVPixelFormat>(par->format));
-    description = video;
-  } else {
-    auto audio = Conf::FormatCodecAudio::Create();
-    audio->SetSampleRate(par->sample_rate);
-    audio->SetChannelLayout(static_cast<Conf::ChannelLayout>(par->ch_layout.u.mask));
-    description = audio;
-  }
-  description->SetCodecID(avcodec_get_name(par->codec_id));
-  description->SetCodecTag(par->codec_tag);
-  if (par->extradata_size > 0)
-    description->SetPrivateData(
-        CreateBlob(par->extradata, static_cast<std::size_t>(par->extradata_size)));
+  const auto description = FFmpeg::DescribeStream(*input, 0).description;
   avformat_close_input(&input);
   return description;
 }

@@ -3,11 +3,10 @@
 // extreme inputs; and the errors for bad input.
 #include <Tarvek/Presets/BitratePresets.h>
 
-#include <algorithm>
+#include <array>
 #include <cstdint>
 #include <functional>
 #include <limits>
-#include <ostream>
 #include <string>
 #include <type_traits>
 #include <utility>
@@ -22,12 +21,7 @@ using Tarvek::DescriptionInfo;
 using TarvekTest::CatchAs;
 using TarvekTest::ItemOf;
 
-struct Trio {
-  std::int64_t min, def, max;
-  bool operator==(const Trio& o) const { return min == o.min && def == o.def && max == o.max; }
-};
-
-void PrintTo(const Trio& t, std::ostream* out) { *out << t.min << "/" << t.def << "/" << t.max; }
+using Trio = std::array<std::int64_t, 3>;  // the minimum, default and maximum bitrate
 
 Trio Video(const std::string& id, long long w, long long h, double fps, int quality) {
   return {GetMinVideoBitrate(id, w, h, fps, quality),
@@ -43,15 +37,14 @@ Trio Audio(const std::string& id, long long rate, ChannelLayout layout,
 }
 
 void ExpectOrdered(const Trio& t, const std::string& where) {
-  EXPECT_GT(t.min, 0) << where;
-  EXPECT_LE(t.min, t.def) << where;
-  EXPECT_LE(t.def, t.max) << where;
+  EXPECT_TRUE(t[0] > 0 && t[0] <= t[1] && t[1] <= t[2])
+      << where << ": " << ::testing::PrintToString(t);
 }
 
 void ExpectNotBelow(const Trio& now, const Trio& before, const std::string& where) {
-  EXPECT_GE(now.min, before.min) << where;
-  EXPECT_GE(now.def, before.def) << where;
-  EXPECT_GE(now.max, before.max) << where;
+  for (std::size_t i = 0; i < now.size(); ++i) {
+    EXPECT_GE(now[i], before[i]) << where << " figure " << i;
+  }
 }
 
 // 16:9 sizes from a macroblock to beyond 8K, in ascending order.
@@ -77,7 +70,7 @@ class VideoPresetTest : public ::testing::TestWithParam<std::string> {};
 
 // Over the grid: min <= default <= max, and no figure falls as the picture grows or the frame
 // rate rises; no default rises with a higher quality number (from 0 up: -1 means none).
-TEST_P(VideoPresetTest, OrderedAndMonotonicOverTheGrid) {
+TEST_P(VideoPresetTest, OrderedMonotonicAndClamped) {
   const std::string& id = GetParam();
   for (std::size_t s = 0; s < kSizes.size(); ++s) {
     const auto& [w, h] = kSizes[s];
@@ -95,23 +88,19 @@ TEST_P(VideoPresetTest, OrderedAndMonotonicOverTheGrid) {
         }
         if (r > 0) ExpectNotBelow(trio, Video(id, w, h, kFrameRates[r - 1], quality), where);
         if (q > 1) {
-          EXPECT_LE(trio.def, Video(id, w, h, fps, kQualities[q - 1]).def) << where;
+          EXPECT_LE(trio[1], Video(id, w, h, fps, kQualities[q - 1])[1]) << where;
         }
       }
     }
   }
-}
-
-// A frame rate of 0 is taken as 30; pictures, rates and qualities beyond the scales count as
-// their ends, and the figures stay far from overflow.
-TEST_P(VideoPresetTest, UnknownAndExtremeInputs) {
-  const std::string& id = GetParam();
+  // A frame rate of 0 is taken as 30; pictures, rates and qualities beyond the scales count as
+  // their ends, and the figures stay far from overflow.
   EXPECT_EQ(Video(id, 1920, 1080, 0.0, -1), Video(id, 1920, 1080, 30.0, -1));
   const int top = std::numeric_limits<int>::max();
   const Trio extreme = Video(id, 4294967295LL, 4294967295LL, 1e300, top);
   const Trio largest = Video(id, 65536, 65536, 240, top);
   EXPECT_EQ(extreme, largest);
-  EXPECT_LT(extreme.max, 100'000'000'000'000LL);
+  EXPECT_LT(extreme[2], 100'000'000'000'000LL);
   EXPECT_EQ(Video(id, 1280, 720, 1e-300, -1), Video(id, 1280, 720, 1.0, -1));
 }
 
@@ -119,33 +108,25 @@ INSTANTIATE_TEST_SUITE_P(AllVideoCodecs, VideoPresetTest,
                          ::testing::ValuesIn(GetPresetVideoCodecs()),
                          [](const auto& info) { return info.param; });
 
-class AudioPresetTest : public ::testing::TestWithParam<std::string> {
- protected:
-  // The channel counts 1..32 the codec carries; they must form one unbroken run.
-  std::vector<int> CarriedChannels() {
-    std::vector<int> carried;
-    for (int n = 1; n <= 32; ++n) {
-      try {
-        GetDefaultAudioBitrate(GetParam(), 48000, Channels(n), AV_SAMPLE_FMT_S16);
-        carried.push_back(n);
-      } catch (const InvalidPresetArgumentError&) {
-      }
-    }
-    EXPECT_FALSE(carried.empty());
-    if (!carried.empty()) {
-      EXPECT_EQ(carried.back() - carried.front() + 1, static_cast<int>(carried.size()));
-    }
-    return carried;
-  }
-};
+class AudioPresetTest : public ::testing::TestWithParam<std::string> {};
 
 const std::vector<long long> kSampleRates = {8000,  11025, 16000, 22050, 24000, 32000,
                                              44100, 48000, 88200, 96000, 192000};
 
 // Over the grid: min <= default <= max, and no figure falls with more channels or a higher
 // sample rate.
+// The channel counts 1..32 the codec carries form one unbroken run.
 TEST_P(AudioPresetTest, OrderedAndMonotonicOverTheGrid) {
-  const std::vector<int> carried = CarriedChannels();
+  std::vector<int> carried;
+  for (int n = 1; n <= 32; ++n) {
+    try {
+      GetDefaultAudioBitrate(GetParam(), 48000, Channels(n), AV_SAMPLE_FMT_S16);
+      carried.push_back(n);
+    } catch (const InvalidPresetArgumentError&) {
+    }
+  }
+  ASSERT_FALSE(carried.empty());
+  EXPECT_EQ(carried.back() - carried.front() + 1, static_cast<int>(carried.size()));
   for (std::size_t c = 0; c < carried.size(); ++c) {
     for (std::size_t r = 0; r < kSampleRates.size(); ++r) {
       const std::string where =
@@ -163,20 +144,6 @@ TEST_P(AudioPresetTest, OrderedAndMonotonicOverTheGrid) {
 INSTANTIATE_TEST_SUITE_P(AllAudioCodecs, AudioPresetTest,
                          ::testing::ValuesIn(GetPresetAudioCodecs()),
                          [](const auto& info) { return info.param; });
-
-TEST(BitratePresetsTest, CodecListsAreSortedAndCoverTheCommonCodecs) {
-  const auto& video = GetPresetVideoCodecs();
-  const auto& audio = GetPresetAudioCodecs();
-  EXPECT_TRUE(std::is_sorted(video.begin(), video.end()));
-  EXPECT_TRUE(std::is_sorted(audio.begin(), audio.end()));
-  for (const char* id : {"h264", "hevc", "vp9", "av1", "mpeg2video", "mpeg4", "prores", "dnxhd",
-                         "vp8", "mpeg1video", "mjpeg", "theora", "ffv1", "png"})
-    EXPECT_NE(std::find(video.begin(), video.end(), id), video.end()) << id;
-  for (const char* id :
-       {"aac", "mp3", "opus", "vorbis", "ac3", "eac3", "flac", "alac", "mp2", "dts", "truehd",
-        "pcm_s16le", "pcm_s24le", "pcm_f32le", "pcm_u8", "pcm_mulaw"})
-    EXPECT_NE(std::find(audio.begin(), audio.end(), id), audio.end()) << id;
-}
 
 TEST(BitratePresetsTest, VideoSpotValuesMatchThePublishedFigures) {
   EXPECT_EQ(GetDefaultVideoBitrate("h264", 1920, 1080, 30, -1), 8'000'000);   // YT-UP 1080p 8
@@ -239,19 +206,19 @@ TEST(BitratePresetsTest, AudioSpotValuesMatchThePublishedFigures) {
   EXPECT_EQ(GetMaxAudioBitrate("pcm_s24le", 96000, CH_LAYOUT_5POINT1, AV_SAMPLE_FMT_S32),
             96000 * 6 * 24);  // the identifier fixes 24 bits, whatever the sample format
   EXPECT_EQ(GetDefaultAudioBitrate("pcm_mulaw", 8000, CH_LAYOUT_MONO, AV_SAMPLE_FMT_NONE),
-            64'000);                                                // G.711
-  EXPECT_EQ(Audio("aac", 48000, stereo).def, 128'000);              // FF-AAC: 64 kbps a channel
-  EXPECT_EQ(Audio("aac", 48000, stereo).max, 576'000);              // 6144 bits / 1024 samples
-  EXPECT_LE(Audio("aac", 44100, stereo).max, 6 * 44100 * 2);        // never above that ceiling
-  EXPECT_EQ(Audio("opus", 48000, stereo).def, 96'000);              // FF-OPUS: one coupled stream
-  EXPECT_EQ(Audio("opus", 48000, CH_LAYOUT_5POINT1).def, 320'000);  // 4 streams, 2 coupled
-  EXPECT_EQ(Audio("ac3", 48000, CH_LAYOUT_5POINT1).def, 448'000);   // FF-TGT DVD
-  EXPECT_EQ(Audio("ac3", 48000, CH_LAYOUT_5POINT1_BACK).def, 448'000);
-  EXPECT_EQ(Audio("mp3", 44100, stereo).max, 320'000);     // MPA MPEG-1 table
-  EXPECT_EQ(Audio("mp3", 22050, stereo).max, 160'000);     // MPA MPEG-2 LSF table
-  EXPECT_EQ(Audio("flac", 44100, stereo).max, 1'411'200);  // incompressible: the PCM rate
-  EXPECT_GT(Audio("flac", 44100, stereo, AV_SAMPLE_FMT_S32).def,
-            Audio("flac", 44100, stereo, AV_SAMPLE_FMT_S16).def);
+            64'000);                                               // G.711
+  EXPECT_EQ(Audio("aac", 48000, stereo)[1], 128'000);              // FF-AAC: 64 kbps a channel
+  EXPECT_EQ(Audio("aac", 48000, stereo)[2], 576'000);              // 6144 bits / 1024 samples
+  EXPECT_LE(Audio("aac", 44100, stereo)[2], 6 * 44100 * 2);        // never above that ceiling
+  EXPECT_EQ(Audio("opus", 48000, stereo)[1], 96'000);              // FF-OPUS: one coupled stream
+  EXPECT_EQ(Audio("opus", 48000, CH_LAYOUT_5POINT1)[1], 320'000);  // 4 streams, 2 coupled
+  EXPECT_EQ(Audio("ac3", 48000, CH_LAYOUT_5POINT1)[1], 448'000);   // FF-TGT DVD
+  EXPECT_EQ(Audio("ac3", 48000, CH_LAYOUT_5POINT1_BACK)[1], 448'000);
+  EXPECT_EQ(Audio("mp3", 44100, stereo)[2], 320'000);     // MPA MPEG-1 table
+  EXPECT_EQ(Audio("mp3", 22050, stereo)[2], 160'000);     // MPA MPEG-2 LSF table
+  EXPECT_EQ(Audio("flac", 44100, stereo)[2], 1'411'200);  // incompressible: the PCM rate
+  EXPECT_GT(Audio("flac", 44100, stereo, AV_SAMPLE_FMT_S32)[1],
+            Audio("flac", 44100, stereo, AV_SAMPLE_FMT_S16)[1]);
 }
 
 // Each refusal is of its own class, a ConfException, and its description names the offending
