@@ -304,29 +304,17 @@ TEST(Options, MissingSettingsNameTheirOption) {
 
 // Every setting read back from the JSON it was written as: the same description again.
 TEST(Options, DescriptionsReadBackFromTheirJson) {
-  VideoArgs video;
-  video.codec = {
+  CodecArgs codec{
       {},   {},  {},   "hevc", "H.265 / HEVC", "hvc1", "cbr",           "4.5M",
       "28", "8", true, false,  true,           true,   {"preset=slow"}, {"probesize=5000000"}};
-  video.size = "720x576";
-  video.pixelAspect = "64:45";
-  video.frameRate = "25";
-  video.pixelFormat = "yuv420p10le";
-  AudioArgs audio;
-  audio.codec.codecId = "aac";
-  audio.sampleRate = "48000";
-  audio.layout = "5.1";
-  audio.sampleFormat = "fltp";
-  audio.frameSize = "1024";
-  audio.language = "eng";
-  SubtitleArgs subtitle;
-  subtitle.codec.codecId = "ass";
-  subtitle.codec.threads = "2";
-  subtitle.language = "eng";
-  subtitle.title = "Director's commentary";
-  subtitle.author = "A. Smithee";
-  subtitle.header = "[Script Info]";
-  subtitle.dvbSize = "720x576";
+  const VideoArgs video{codec, "720x576", {}, "64:45", "25", "yuv420p10le"};
+  codec = CodecArgs();
+  codec.codecId = "aac";
+  const AudioArgs audio{codec, "48000", "5.1", "1024", "fltp", "eng"};
+  codec.codecId = "ass";
+  codec.threads = "2";
+  const SubtitleArgs subtitle{codec,        "eng",           "Director's commentary",
+                              "A. Smithee", "[Script Info]", "720x576"};
   const auto again = [](auto args, auto build) {
     const Json json = DescriptionJson(build(args), std::nullopt);
     args = decltype(args)();
