@@ -661,7 +661,8 @@ TEST(Probe, DamagedFilesAreReported) {
       try {
         const FileReport report = ProbeFile(path);
         PrintProbe(path, report, std::nullopt);
-        for (const Json& stream : ProbeJson(path, report, std::nullopt)["streams"]) {
+        const Json json = ProbeJson(path, report, std::nullopt);
+        for (const Json& stream : json["streams"]) {
           const std::string status = stream["status"];
           EXPECT_TRUE(status == "described" || status == "skipped" ||
                       (status == "damaged" && !stream["damage"].get<std::string>().empty()))
