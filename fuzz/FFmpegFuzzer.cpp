@@ -48,8 +48,16 @@ struct ParametersFree {
   void operator()(AVCodecParameters* p) const { avcodec_parameters_free(&p); }
 };
 
+// A byte read as a value from `first` to `last`: every named value of the enumeration and one past
+// them (a value a newer libavutil may name), never one the enumeration cannot hold.
+template <class Enum>
+Enum TakeEnum(Input& in, Enum first, Enum last) {
+  const int span = static_cast<int>(last) - static_cast<int>(first) + 1;
+  return static_cast<Enum>(static_cast<int>(first) + in.Take<std::uint8_t>() % span);
+}
+
 void Fill(AVCodecParameters& p, Input& in) {
-  p.codec_type = static_cast<AVMediaType>(in.Take<std::int8_t>());
+  p.codec_type = TakeEnum(in, AVMEDIA_TYPE_UNKNOWN, AVMEDIA_TYPE_NB);
   p.codec_id = static_cast<AVCodecID>(in.Take<std::uint32_t>() % 0x22000);
   p.codec_tag = in.Take<std::uint32_t>();
   p.format = in.Take<std::int32_t>();
@@ -61,12 +69,12 @@ void Fill(AVCodecParameters& p, Input& in) {
   p.width = in.Take<std::int32_t>();
   p.height = in.Take<std::int32_t>();
   p.sample_aspect_ratio = {in.Take<std::int32_t>(), in.Take<std::int32_t>()};
-  p.field_order = static_cast<AVFieldOrder>(in.Take<std::int8_t>());
-  p.color_range = static_cast<AVColorRange>(in.Take<std::int8_t>());
-  p.color_primaries = static_cast<AVColorPrimaries>(in.Take<std::int8_t>());
-  p.color_trc = static_cast<AVColorTransferCharacteristic>(in.Take<std::int8_t>());
-  p.color_space = static_cast<AVColorSpace>(in.Take<std::int8_t>());
-  p.chroma_location = static_cast<AVChromaLocation>(in.Take<std::int8_t>());
+  p.field_order = TakeEnum(in, AV_FIELD_UNKNOWN, static_cast<AVFieldOrder>(AV_FIELD_BT + 1));
+  p.color_range = TakeEnum(in, AVCOL_RANGE_UNSPECIFIED, AVCOL_RANGE_NB);
+  p.color_primaries = TakeEnum(in, AVCOL_PRI_RESERVED0, AVCOL_PRI_NB);
+  p.color_trc = TakeEnum(in, AVCOL_TRC_RESERVED0, AVCOL_TRC_NB);
+  p.color_space = TakeEnum(in, AVCOL_SPC_RGB, AVCOL_SPC_NB);
+  p.chroma_location = TakeEnum(in, AVCHROMA_LOC_UNSPECIFIED, AVCHROMA_LOC_NB);
   p.video_delay = in.Take<std::int32_t>();
   p.sample_rate = in.Take<std::int32_t>();
   p.block_align = in.Take<std::int32_t>();
