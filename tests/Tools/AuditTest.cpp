@@ -34,7 +34,7 @@ std::string Slurp(const fs::path& path) {
 }
 
 // Runs `command` with sh in the work folder, with a time limit so that a stalled run fails.
-Result Run(const std::string& command) {
+Result Shell(const std::string& command) {
   const std::string err = std::string(AUDIT_WORK) + "/stderr.txt";
   const std::string line =
       "cd '" AUDIT_WORK "' && timeout 120 sh -c '" + command + "' 2>'" + err + "'";
@@ -68,26 +68,31 @@ void Copy(const std::string& name, const fs::path& to) {
 // a name with a newline and one that is not UTF-8.
 class AuditLibrary : public ::testing::Test {
  protected:
-  static void SetUpTestSuite() {
-    const fs::path work = AUDIT_WORK;
-    fs::remove_all(work);
-    const fs::path lib = work / "lib";
-    Copy("sd.mp4", lib / "a/sd.mp4");
-    Copy("stereo.wav", lib / "a/stereo.wav");
-    Copy("damaged.ts", lib / "b/damaged.ts");
-    fs::create_symlink("nowhere.mp4", lib / "b/gone.mp4");
-    ASSERT_EQ(mkfifo((lib / "c/fifo").c_str(), 0600), 0);
-    fs::create_directory_symlink("..", lib / "c/loop");
-    Copy("stereo.wav", lib / "new\nline.wav");
-    Copy("surround.ac3", lib / "\xff\xfe.ac3");
-    for (const char* name : {"sd.mp4", "low.avi", "stereo.wav", "mono.ac3", "subtitles.mkv"}) {
-      Copy(name, work / "shard" / name);
-    }
+  // Made once for the suite; a failure here fails each test rather than skipping it.
+  void SetUp() override {
+    static const bool made = [] {
+      const fs::path work = AUDIT_WORK;
+      fs::remove_all(work);
+      const fs::path lib = work / "lib";
+      Copy("sd.mp4", lib / "a/sd.mp4");
+      Copy("stereo.wav", lib / "a/stereo.wav");
+      Copy("damaged.ts", lib / "b/damaged.ts");
+      fs::create_symlink("nowhere.mp4", lib / "b/gone.mp4");
+      fs::create_directories(lib / "c");
+      fs::create_directory_symlink("..", lib / "c/loop");
+      Copy("stereo.wav", lib / "new\nline.wav");
+      Copy("surround.ac3", lib / "\xff\xfe.ac3");
+      for (const char* name : {"sd.mp4", "low.avi", "stereo.wav", "mono.ac3", "subtitles.mkv"}) {
+        Copy(name, work / "shard" / name);
+      }
+      return mkfifo((lib / "c/fifo").c_str(), 0600) == 0;
+    }();
+    ASSERT_TRUE(made);
   }
 };
 
 TEST_F(AuditLibrary, EveryEntryIsReportedInOrderAndSummarised) {
-  const Result run = Run(kTool + " probe lib --jsonl --jobs 3");
+  const Result run = Shell(kTool + " probe lib --jsonl --jobs 3");
   EXPECT_EQ(run.status, 2) << run.err;  // the link to nothing could not be read
   const std::vector<std::string> lines = Lines(run.out);
   ASSERT_EQ(lines.size(), 8u) << run.out;
@@ -101,7 +106,9 @@ TEST_F(AuditLibrary, EveryEntryIsReportedInOrderAndSummarised) {
     records.push_back(nlohmann::json::parse(lines[i]));
     const nlohmann::json& record = records.back();
     EXPECT_EQ(record["status"], expected[i].second) << lines[i];
-    if (!expected[i].first.empty()) EXPECT_EQ(record["path"], expected[i].first);
+    if (!expected[i].first.empty()) {
+      EXPECT_EQ(record["path"], expected[i].first);
+    }
   }
   // Bytes that are not UTF-8 are kept exactly, in base64.
   EXPECT_FALSE(records[7].contains("path"));
@@ -113,23 +120,23 @@ TEST_F(AuditLibrary, EveryEntryIsReportedInOrderAndSummarised) {
             nlohmann::json::parse(R"([{"index":0,"codec":"mpeg4","result":"within"},
                                       {"index":1,"codec":"ac3","result":"within"}])"));
   // A file's streams are those probe --json gives for it alone.
-  const Result alone = Run(kTool + " probe lib/a/sd.mp4 --json");
+  const Result alone = Shell(kTool + " probe lib/a/sd.mp4 --json");
   EXPECT_EQ(records[0]["streams"], nlohmann::json::parse(alone.out)["streams"]);
   EXPECT_EQ(run.err,
             "Summary: 8 paths, 5 read (1 with a damaged stream), 1 error, 2 skipped\n"
             "Streams: 5 audio, 2 video\n"
             "Verdicts by codec:\n"
-            "  codec          below     within      above  no preset no bitrate      other"
+            "  codec             below     within      above  no preset no bitrate      other"
             "   lossless\n"
-            "  ac3                0          3          0          0          0          0"
+            "  ac3                   0          3          0          0          0          0"
             "          0\n"
-            "  mpeg4              0          1          0          0          0          0"
+            "  mpeg4                 0          1          0          0          0          0"
             "          0\n"
-            "  pcm_s16le          0          2          0          0          0          0"
+            "  pcm_s16le             0          2          0          0          0          0"
             "          0\n");
   // One thread writes the same lines; text mode the same summary on standard output.
-  EXPECT_EQ(Run(kTool + " probe lib --jsonl --jobs 1").out, run.out);
-  const Result text = Run(kTool + " probe lib --jobs 2");
+  EXPECT_EQ(Shell(kTool + " probe lib --jsonl --jobs 1").out, run.out);
+  const Result text = Shell(kTool + " probe lib --jobs 2");
   EXPECT_EQ(text.status, 2);
   EXPECT_NE(text.out.find("\nFile: lib/c/fifo\nSkipped: skipped 'lib/c/fifo'"), std::string::npos);
   EXPECT_EQ(text.out.substr(text.out.size() - run.err.size()), run.err);
@@ -137,21 +144,21 @@ TEST_F(AuditLibrary, EveryEntryIsReportedInOrderAndSummarised) {
 
 TEST_F(AuditLibrary, ShardedWithParallelGivesTheSameLines) {
   const std::string list = "find shard -type f | ";
-  const Result single = Run(list + kTool + " probe - --jsonl | sort");
-  const Result sharded = Run(list + "parallel --will-cite --pipe -N2 --sshlogin : " + kTool +
-                             " probe - --jsonl | sort");
+  const Result single = Shell(list + kTool + " probe - --jsonl | sort");
+  const Result sharded = Shell(list + "parallel --will-cite --pipe -N2 --sshlogin : " + kTool +
+                               " probe - --jsonl | sort");
   EXPECT_EQ(sharded.status, 0) << sharded.err;
   EXPECT_EQ(Lines(single.out).size(), 5u);
   EXPECT_EQ(sharded.out, single.out);
-  EXPECT_EQ(Run(kTool + " probe shard --jsonl | sort").out, single.out);
-  EXPECT_EQ(Run("printf \"\" | " + kTool + " probe - --jsonl").status, 0);
+  EXPECT_EQ(Shell(kTool + " probe shard --jsonl | sort").out, single.out);
+  EXPECT_EQ(Shell("printf \"\" | " + kTool + " probe - --jsonl").status, 0);
 }
 
 TEST_F(AuditLibrary, ReportIsWellFormedAndItsChartRenders) {
-  const Result run = Run(kTool + " probe shard --report report.html");
+  const Result run = Shell(kTool + " probe shard --report report.html");
   EXPECT_EQ(run.status, 0) << run.err;
   const std::string page = Slurp(fs::path(AUDIT_WORK) / "report.html");
-  EXPECT_EQ(Run("xmllint --noout report.html").status, 0);
+  EXPECT_EQ(Shell("xmllint --noout report.html").status, 0);
   for (const char* fetch : {"<script", "src=", "href=", "<link"}) {
     EXPECT_EQ(page.find(fetch), std::string::npos) << fetch;
   }
@@ -167,7 +174,7 @@ TEST_F(AuditLibrary, ReportIsWellFormedAndItsChartRenders) {
   }
   EXPECT_EQ(dots, 2u);
   std::ofstream(fs::path(AUDIT_WORK) / "chart.svg") << chart;
-  EXPECT_EQ(Run("rsvg-convert -o chart.png chart.svg").status, 0);
+  EXPECT_EQ(Shell("rsvg-convert -o chart.png chart.svg").status, 0);
   EXPECT_GT(fs::file_size(fs::path(AUDIT_WORK) / "chart.png"), 0u);
 }
 
@@ -183,7 +190,7 @@ TEST(AuditJson, HundredThousandMetadataEntries) {
   fs::create_directories(AUDIT_WORK);
   std::ofstream(fs::path(AUDIT_WORK) / "big.json") << Tarvek::Conf::ToJson(video);
   const auto start = std::chrono::steady_clock::now();
-  const Result run = Run(kTool + " video --from-json big.json --no-bitrate --json");
+  const Result run = Shell(kTool + " video --from-json big.json --no-bitrate --json");
   const double seconds =
       std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
   ASSERT_EQ(run.status, 0) << run.err;
