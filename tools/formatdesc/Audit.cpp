@@ -572,6 +572,14 @@ std::string AuditLine(const AuditEntry& entry, const FileReport* report) {
 }
 
 int RunAudit(PathWalk& walk, const AuditOptions& options, std::optional<long long> total) {
+  // The report's file is opened first, so that a name that cannot be written is known at once.
+  std::ofstream page;
+  if (options.report) {
+    page.open(*options.report, std::ios::binary);
+    if (!page) {
+      throw UsageError("--report: cannot write '" + *options.report + "': " + std::strerror(errno));
+    }
+  }
   AuditSummary summary;
   Progress progress(isatty(STDERR_FILENO) != 0, total);
   {
@@ -616,9 +624,8 @@ int RunAudit(PathWalk& walk, const AuditOptions& options, std::optional<long lon
     PrintSummary(std::cout, summary);
   }
   if (options.report) {
-    std::ofstream file(*options.report, std::ios::binary);
-    if (file) WriteReport(file, summary);
-    if (!file || !file.flush()) {
+    WriteReport(page, summary);
+    if (!page.flush()) {
       throw UsageError("--report: cannot write '" + *options.report + "': " + std::strerror(errno));
     }
   }

@@ -273,7 +273,7 @@ void AddProbe(CLI::App& app, ProbeArgs& args) {
                    "Media files, folders (walked recursively, in sorted order), or - for a list "
                    "of paths on standard input, one a line")
       ->required()
-      ->type_name("PATH...");
+      ->type_name("PATH");
   AddText(*probe, "--stream", args.stream,
           "Only the stream of this index (0 is the first); one file only", "N");
   probe->add_flag("--json", args.json, "Print one JSON object instead of text; one file only");
@@ -482,7 +482,7 @@ int RunProbe(const ProbeArgs& args) {
   });
   if (args.paths.size() == 1 && !folder && !args.jsonl && !args.report) return RunProbeFile(args);
   if (args.json) throw UsageError("--json describes one file; use --jsonl for several");
-  if (args.stream) throw UsageError("--stream picks a stream of one file; it takes no folder");
+  if (args.stream) throw UsageError("--stream picks a stream of one file; give one file");
   AuditOptions options;
   const unsigned int cores = std::max(1u, std::thread::hardware_concurrency());
   options.jobs =
