@@ -428,7 +428,7 @@ StreamReport DescribeStream(const AVFormatContext& context, unsigned int index,
   return report;
 }
 
-std::string SpecialFileKind(const std::string& path) {
+std::string OtherFileKind(const std::string& path) {
   struct stat status {};
   if (stat(path.c_str(), &status) != 0 || S_ISREG(status.st_mode)) return std::string();
   return FileKind(status.st_mode);
@@ -437,9 +437,9 @@ std::string SpecialFileKind(const std::string& path) {
 FileReport ProbeFile(const std::string& path, bool measure, bool progress) {
   // Only a regular file is opened: opening a FIFO or a device could wait forever. A name that
   // cannot be looked up is left to libavformat, whose message says why.
-  const std::string special = SpecialFileKind(path);
-  if (!special.empty()) {
-    throw UsageError("cannot read '" + path + "': " + special + ", not a regular file");
+  const std::string other = OtherFileKind(path);
+  if (!other.empty()) {
+    throw UsageError("cannot read '" + path + "': " + other + ", not a regular file");
   }
   const QuietLog quiet;
   // The file protocol alone: a name such as "http://..." or "concat:..." is a file name here.

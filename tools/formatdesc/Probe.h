@@ -99,7 +99,7 @@ struct FileReport {
 /// What `path` is when it exists and is not a regular file ("a FIFO", "a folder", "a character
 /// device" ...); empty for a regular file or a path that cannot be looked up. Throws only
 /// std::bad_alloc.
-std::string SpecialFileKind(const std::string& path);
+std::string OtherFileKind(const std::string& path);
 
 /// Opens the file at `path` (a local regular file, never a network address, another protocol, a
 /// FIFO or a device) and reports every stream; with `measure`, reads every packet first to

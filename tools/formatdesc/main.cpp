@@ -478,7 +478,7 @@ int RunProbeFile(const ProbeArgs& args) {
 // The exit status of probe: one file named alone as before, otherwise the audit of every path.
 int RunProbe(const ProbeArgs& args) {
   const bool folder = std::any_of(args.paths.begin(), args.paths.end(), [](const std::string& p) {
-    return p == "-" || SpecialFileKind(p) == "a folder";
+    return p == "-" || OtherFileKind(p) == "a folder";
   });
   if (args.paths.size() == 1 && !folder && !args.jsonl && !args.report) return RunProbeFile(args);
   if (args.json) throw UsageError("--json describes one file; use --jsonl for several");
