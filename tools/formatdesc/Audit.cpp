@@ -221,26 +221,35 @@ class Pipeline {
     }
   }
 
+  // Nothing a file holds may end the run: every failure becomes the file's error.
   void Process(Slot& slot) {
     AuditEntry& entry = slot.entry;
-    try {
-      if (entry.kind == AuditEntry::Kind::File) {
-        try {
-          slot.report = ProbeFile(entry.path, options_.measure, false);
-        } catch (const std::bad_alloc&) {
-          throw;
-        } catch (const std::exception& e) {
-          entry.kind = AuditEntry::Kind::Error;
-          entry.message = e.what();
-        }
+    if (entry.kind == AuditEntry::Kind::File) {
+      try {
+        slot.report = ProbeFile(entry.path, options_.measure, false);
+      } catch (const std::exception& e) {
+        Failed(slot, e.what());
+      } catch (...) {
+        Failed(slot, "cannot read '" + entry.path + "': an unexpected error");
       }
-      if (options_.jsonl) slot.line = AuditLine(entry, slot.report ? &*slot.report : nullptr);
-    } catch (const std::bad_alloc&) {
-      slot.report.reset();
-      entry.kind = AuditEntry::Kind::Error;
-      entry.message = "out of memory while probing '" + entry.path + "'";
-      slot.line = options_.jsonl ? AuditLine(entry, nullptr) : std::string();
     }
+    if (!options_.jsonl) return;
+    try {
+      slot.line = AuditLine(entry, slot.report ? &*slot.report : nullptr);
+    } catch (...) {
+      Failed(slot, "cannot write the record of '" + entry.path + "'");
+      try {
+        slot.line = AuditLine(entry, nullptr);
+      } catch (...) {
+        slot.line = R"({"status":"error","error":"out of memory"})";
+      }
+    }
+  }
+
+  static void Failed(Slot& slot, const std::string& message) {
+    slot.report.reset();
+    slot.entry.kind = AuditEntry::Kind::Error;
+    slot.entry.message = message;
   }
 
   const AuditOptions& options_;
