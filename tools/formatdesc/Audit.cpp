@@ -297,6 +297,7 @@ class Progress {
   // Clears the bar, before the summary.
   void Clear() {
     if (shown_ && width_ > 0) std::cerr << "\r" << std::string(width_, ' ') << "\r" << std::flush;
+    width_ = 0;
   }
 
  private:
@@ -591,6 +592,9 @@ int RunAudit(PathWalk& walk, const AuditOptions& options, std::optional<long lon
   }
   AuditSummary summary;
   Progress progress(isatty(STDERR_FILENO) != 0, total);
+  // Text written to the terminal the bar is drawn on: the bar is cleared before each file's text
+  // and drawn again below it.
+  const bool shared = !options.jsonl && isatty(STDOUT_FILENO) != 0;
   {
     Pipeline pipeline(options);
     const std::size_t window = std::max(4u, options.jobs * 4u);
@@ -606,6 +610,7 @@ int RunAudit(PathWalk& walk, const AuditOptions& options, std::optional<long lon
       }
       if (pipeline.InFlight() == 0) break;
       const std::unique_ptr<Pipeline::Slot> slot = pipeline.PopFront();
+      if (shared) progress.Clear();
       const AuditEntry& entry = slot->entry;
       const FileReport* report = slot->report ? &*slot->report : nullptr;
       if (options.jsonl) {
@@ -621,7 +626,8 @@ int RunAudit(PathWalk& walk, const AuditOptions& options, std::optional<long lon
         }
       }
       summary.Add(entry, report);
-      progress.Update(summary.files);
+      if (shared) std::cout << std::flush;
+      progress.Update(summary.files, shared);
     }
   }
   progress.Update(summary.files, true);
