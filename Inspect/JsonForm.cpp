@@ -437,34 +437,37 @@ std::string PointerComponent(const std::string& name) {
   return out;
 }
 
-// Follows the parse to refuse an object that names a member twice (JSON takes the last one
-// silently, so an edit of the first would be lost), naming the member's JSON pointer.
-class DuplicateMembers {
+// Reads the text as a stream of events, holding no values, to refuse an object that names a
+// member twice (JSON takes the last one silently, so an edit of the first would be lost), naming
+// the member's JSON pointer. A reader of its own rather than a parse callback: the callback parser
+// searches the enclosing container at every object's end, which makes a long array of objects
+// (a container of many children) take quadratic time.
+class DuplicateMembers : public nlohmann::json_sax<Json> {
  public:
-  bool operator()(int /*depth*/, Json::parse_event_t event, Json& parsed) {
-    switch (event) {
-      case Json::parse_event_t::object_start:
-      case Json::parse_event_t::array_start:
-        frames_.push_back({event == Json::parse_event_t::object_start, Component(), {}, {}, 0});
-        break;
-      case Json::parse_event_t::key: {
-        Frame& frame = frames_.back();
-        frame.key = parsed.get_ref<const std::string&>();
-        if (!frame.keys.insert(frame.key).second) {
-          Fail(Pointer() + "/" + PointerComponent(frame.key),
-               "the member " + Quote(frame.key) + " appears twice in one object");
-        }
-        break;
-      }
-      case Json::parse_event_t::value:
-        if (!frames_.empty() && !frames_.back().object) ++frames_.back().next;
-        break;
-      case Json::parse_event_t::object_end:
-      case Json::parse_event_t::array_end:
-        frames_.pop_back();
-        break;
+  bool null() override { return Value(); }
+  bool boolean(bool /*value*/) override { return Value(); }
+  bool number_integer(number_integer_t /*value*/) override { return Value(); }
+  bool number_unsigned(number_unsigned_t /*value*/) override { return Value(); }
+  bool number_float(number_float_t /*value*/, const string_t& /*text*/) override { return Value(); }
+  bool string(string_t& /*value*/) override { return Value(); }
+  bool binary(binary_t& /*value*/) override { return Value(); }
+  bool start_object(std::size_t /*elements*/) override { return Start(true); }
+  bool start_array(std::size_t /*elements*/) override { return Start(false); }
+  bool end_object() override { return End(); }
+  bool end_array() override { return End(); }
+  bool key(string_t& key) override {
+    Frame& frame = frames_.back();
+    frame.key = key;
+    if (!frame.keys.insert(frame.key).second) {
+      Fail(Pointer() + "/" + PointerComponent(frame.key),
+           "the member " + Quote(frame.key) + " appears twice in one object");
     }
     return true;
+  }
+  // Malformed text stops the reading; the parse that follows reports it.
+  bool parse_error(std::size_t /*position*/, const std::string& /*token*/,
+                   const nlohmann::detail::exception& /*error*/) override {
+    return false;
   }
 
  private:
@@ -475,6 +478,19 @@ class DuplicateMembers {
     std::string key;   // the member being read, in an object
     std::size_t next;  // the index of the next element, in an array
   };
+
+  bool Value() {
+    if (!frames_.empty() && !frames_.back().object) ++frames_.back().next;
+    return true;
+  }
+  bool Start(bool object) {
+    frames_.push_back({object, Component(), {}, {}, 0});
+    return true;
+  }
+  bool End() {
+    frames_.pop_back();
+    return true;
+  }
 
   // The component of a value that starts now, inside the innermost container.
   std::string Component() {
@@ -495,7 +511,9 @@ class DuplicateMembers {
 Json Parse(const std::string& text) {
   CheckNesting(text);
   try {
-    return Json::parse(text, DuplicateMembers());
+    DuplicateMembers duplicates;
+    Json::sax_parse(text, &duplicates);
+    return Json::parse(text);
   } catch (const Json::exception& e) {
     // "[json.exception.parse_error.101] parse error at line 1, column 7: ..." without its tag.
     const std::string what = e.what();

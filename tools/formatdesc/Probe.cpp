@@ -14,6 +14,7 @@ extern "C" {
 #include <Tarvek/FFmpeg/Names.h>
 #include <Tarvek/FFmpeg/Streams.h>
 
+#include <sys/stat.h>
 #include <unistd.h>
 #include <boost/exception/get_error_info.hpp>
 #include <cmath>
@@ -24,6 +25,7 @@ extern "C" {
 #include <limits>
 #include <map>
 #include <memory>
+#include <mutex>
 
 namespace Formatdesc {
 namespace {
@@ -139,24 +141,38 @@ void Judge(StreamReport& report, const AVCodecParameters& parameters) {
   report.verdict = JudgeBitrate(codec.GetBitrate(), *report.range);
 }
 
-// Keeps libavformat's messages off the terminal while it lives, and remembers the last error
-// message so that a failure can say more than its error code.
+// Keeps libavformat's messages off the terminal while any instance lives, and remembers the last
+// error message of the thread that logged it, so that a failure can say more than its error code.
+// Files probed on several threads at once each keep their own message; the callback is installed
+// by the first instance and restored by the last.
 class QuietLog {
  public:
   QuietLog() {
     LastError().clear();
-    av_log_set_callback(&QuietLog::Keep);
+    const std::lock_guard<std::mutex> lock(Mutex());
+    if (Users()++ == 0) av_log_set_callback(&QuietLog::Keep);
   }
-  ~QuietLog() { av_log_set_callback(&av_log_default_callback); }
+  ~QuietLog() {
+    const std::lock_guard<std::mutex> lock(Mutex());
+    if (--Users() == 0) av_log_set_callback(&av_log_default_callback);
+  }
   QuietLog(const QuietLog&) = delete;
   QuietLog& operator=(const QuietLog&) = delete;
 
   static std::string& LastError() {
-    static std::string text;
+    thread_local std::string text;
     return text;
   }
 
  private:
+  static std::mutex& Mutex() {
+    static std::mutex mutex;
+    return mutex;
+  }
+  static int& Users() {
+    static int users = 0;
+    return users;
+  }
   static void Keep(void*, int level, const char* format, va_list arguments) {
     if (level > AV_LOG_ERROR || format == nullptr) return;
     char line[512];
@@ -167,6 +183,16 @@ class QuietLog {
     if (!text.empty()) LastError() = text;
   }
 };
+
+// "a FIFO": what a file that is not a regular one is, for a message.
+std::string FileKind(mode_t mode) {
+  if (S_ISDIR(mode)) return "a folder";
+  if (S_ISFIFO(mode)) return "a FIFO";
+  if (S_ISCHR(mode)) return "a character device";
+  if (S_ISBLK(mode)) return "a block device";
+  if (S_ISSOCK(mode)) return "a socket";
+  return "not a regular file";
+}
 
 // "Invalid data found when processing input (moov atom not found)": the error code's text and,
 // when libavformat said more, its last message.
@@ -402,7 +428,19 @@ StreamReport DescribeStream(const AVFormatContext& context, unsigned int index,
   return report;
 }
 
-FileReport ProbeFile(const std::string& path, bool measure) {
+std::string OtherFileKind(const std::string& path) {
+  struct stat status {};
+  if (stat(path.c_str(), &status) != 0 || S_ISREG(status.st_mode)) return std::string();
+  return FileKind(status.st_mode);
+}
+
+FileReport ProbeFile(const std::string& path, bool measure, bool progress) {
+  // Only a regular file is opened: opening a FIFO or a device could wait forever. A name that
+  // cannot be looked up is left to libavformat, whose message says why.
+  const std::string other = OtherFileKind(path);
+  if (!other.empty()) {
+    throw UsageError("cannot read '" + path + "': " + other + ", not a regular file");
+  }
   const QuietLog quiet;
   // The file protocol alone: a name such as "http://..." or "concat:..." is a file name here.
   AVDictionary* options = nullptr;
@@ -433,7 +471,7 @@ FileReport ProbeFile(const std::string& path, bool measure) {
   std::vector<long long> measured(input->nb_streams, 0);
   if (measure) {
     // A bar on a terminal only; a file read in a blink shows none.
-    const bool bar = isatty(STDERR_FILENO) != 0;
+    const bool bar = progress && isatty(STDERR_FILENO) != 0;
     int shown = -1;
     measured = Bridge::MeasureBitrates(*input, [&](double share) {
       const int percent = static_cast<int>(share * 100.0);

@@ -96,13 +96,19 @@ struct FileReport {
   std::vector<StreamReport> streams;
 };
 
-/// Opens the file at `path` (a local file, never a network address or another protocol) and
-/// reports every stream; with `measure`, reads every packet first to measure the bitrate of
-/// streams for which the file states none (with a progress bar on a terminal). Throws UsageError,
-/// with libavformat's reason, for a file that cannot be opened or read, that libavformat does not
-/// recognise as media, or that holds no stream. A damaged stream is reported, not thrown.
-/// libavformat's own messages are kept off the terminal while it runs.
-FileReport ProbeFile(const std::string& path, bool measure = false);
+/// What `path` is when it exists and is not a regular file ("a FIFO", "a folder", "a character
+/// device" ...); empty for a regular file or a path that cannot be looked up. Throws only
+/// std::bad_alloc.
+std::string OtherFileKind(const std::string& path);
+
+/// Opens the file at `path` (a local regular file, never a network address, another protocol, a
+/// FIFO or a device) and reports every stream; with `measure`, reads every packet first to
+/// measure the bitrate of streams for which the file states none (with a progress bar on a
+/// terminal when `progress`). Throws UsageError, with libavformat's reason, for a file that
+/// cannot be opened or read, is not a regular file, that libavformat does not recognise as
+/// media, or that holds no stream. A damaged stream is reported, not thrown. libavformat's own
+/// messages are kept off the terminal while it runs. Safe to call on several threads at once.
+FileReport ProbeFile(const std::string& path, bool measure = false, bool progress = true);
 
 /// Prints a line naming `path`, its container and its stream count, then each stream of
 /// `report` (only stream `only` when given): a heading line "Stream N: kind (codec)", then the

@@ -4,7 +4,8 @@
 // turns every failure into one line on standard error and an exit status:
 //   0 success, 1 the library refused (for example a setting the bitrates need is missing, or a
 //   file holds no description), validate found an error or probe found a damaged stream, 2 bad
-//   usage (an unknown option, a value or file that cannot be read, a file that is not media).
+//   usage (an unknown option, a value or file that cannot be read, a file that is not media;
+//   for probe of several paths, some path that could not be read).
 #include <Tarvek/Formats.h>
 #include <Tarvek/Inspect/Diff.h>
 #include <Tarvek/Inspect/JsonForm.h>
@@ -18,7 +19,9 @@
 #include <iostream>
 #include <limits>
 #include <new>
+#include <thread>
 
+#include "Audit.h"
 #include "Describe.h"
 #include "Options.h"
 #include "Output.h"
@@ -68,9 +71,12 @@ constexpr const char* kFromJsonHelp =
     "Start from the description in FILE (as --json writes it); the options change it";
 
 struct ProbeArgs {
-  std::string file;
+  std::vector<std::string> paths;
   std::optional<std::string> stream;
+  std::optional<std::string> jobs;
+  std::optional<std::string> report;
   bool json = false;
+  bool jsonl = false;
   bool measure = false;
 };
 
@@ -260,13 +266,25 @@ void AddValidate(CLI::App& app, ValidateArgs& args) {
 }
 
 void AddProbe(CLI::App& app, ProbeArgs& args) {
-  CLI::App* probe =
-      app.add_subcommand("probe", "Describe the streams of a media file, with bitrate verdicts");
-  probe->add_option("file", args.file, "The media file, read with libavformat")
+  CLI::App* probe = app.add_subcommand(
+      "probe", "Describe the streams of media files or a whole library, with bitrate verdicts");
+  probe
+      ->add_option("file", args.paths,
+                   "Media files, folders (walked recursively, in sorted order), or - for a list "
+                   "of paths on standard input, one a line")
       ->required()
-      ->type_name("FILE");
-  AddText(*probe, "--stream", args.stream, "Only the stream of this index (0 is the first)", "N");
-  probe->add_flag("--json", args.json, "Print one JSON object instead of text");
+      ->type_name("PATH");
+  AddText(*probe, "--stream", args.stream,
+          "Only the stream of this index (0 is the first); one file only", "N");
+  probe->add_flag("--json", args.json, "Print one JSON object instead of text; one file only");
+  probe->add_flag("--jsonl", args.jsonl,
+                  "One JSON object a line for each path, in input order, and the summary on "
+                  "standard error");
+  AddText(*probe, "--jobs", args.jobs, "Files probed at once (default: the number of cores)", "N");
+  AddText(*probe, "--report", args.report,
+          "Also write a self-contained XHTML page with the summary and a chart of the video "
+          "streams' bits per pixel",
+          "FILE.html");
   probe->add_flag("--measure", args.measure,
                   "Read every packet to measure the bitrate of streams the file states none for");
   probe->footer(
@@ -281,8 +299,10 @@ void AddProbe(CLI::App& app, ProbeArgs& args) {
       "is the stream's, else the container's statistics tag (BPS), else the container's total\n"
       "for a file of one stream; --measure counts the packets where the file states none. The\n"
       "output says which. Layouts and tags are named as FFmpeg names them.\n"
-      "Exit status: 0 on success, 1 when a stream shown is damaged (it is reported, the others\n"
-      "are described), 2 for bad usage or a file that cannot be read or is not media.");
+      "Several paths, a folder, - or --jsonl audit a library: each file in input order, then a\n"
+      "summary; FIFOs, devices and loops of links are skipped with a note.\n"
+      "Exit status: 0 when every file was read, 1 when a stream is damaged (it is reported, the\n"
+      "others are described), 2 for bad usage or a path that cannot be read or is not media.");
 }
 
 void Show(const boost::intrusive_ptr<Tarvek::Conf::IFormatCodec>& codec,
@@ -427,30 +447,54 @@ bool RunValidate(const ValidateArgs& args) {
   });
 }
 
-// True when a stream shown is damaged.
-bool RunProbe(const ProbeArgs& args) {
+// One file as before the library audit: exit status 1 when a stream shown is damaged; a file
+// that cannot be read throws.
+int RunProbeFile(const ProbeArgs& args) {
+  const std::string& path = args.paths.front();
   std::optional<long long> only;
   if (args.stream) {
     only = ParseNonNegative("--stream", *args.stream, std::numeric_limits<int>::max());
   }
-  const FileReport report = ProbeFile(args.file, args.measure);
+  const FileReport report = ProbeFile(path, args.measure);
   const auto count = static_cast<long long>(report.streams.size());
   if (only && *only >= count) {
-    throw BadValue(
-        "--stream",
-        "a stream index from 0 to " + std::to_string(count - 1) + " of '" + args.file + "'",
-        *args.stream);
+    throw BadValue("--stream",
+                   "a stream index from 0 to " + std::to_string(count - 1) + " of '" + path + "'",
+                   *args.stream);
   }
   const std::optional<int> shown =
       only ? std::optional<int>(static_cast<int>(*only)) : std::optional<int>();
   if (args.json) {
-    PrintJson(std::cout, ProbeJson(args.file, report, shown));
+    PrintJson(std::cout, ProbeJson(path, report, shown));
   } else {
-    PrintProbe(args.file, report, shown);
+    PrintProbe(path, report, shown);
   }
-  return std::any_of(report.streams.begin(), report.streams.end(), [&](const StreamReport& s) {
-    return !s.damage.empty() && (!shown || s.index == *shown);
+  const bool damaged = std::any_of(
+      report.streams.begin(), report.streams.end(),
+      [&](const StreamReport& s) { return !s.damage.empty() && (!shown || s.index == *shown); });
+  return damaged ? kLibraryError : 0;
+}
+
+// The exit status of probe: one file named alone as before, otherwise the audit of every path.
+int RunProbe(const ProbeArgs& args) {
+  const bool folder = std::any_of(args.paths.begin(), args.paths.end(), [](const std::string& p) {
+    return p == "-" || OtherFileKind(p) == "a folder";
   });
+  if (args.paths.size() == 1 && !folder && !args.jsonl && !args.report) return RunProbeFile(args);
+  if (args.json) throw UsageError("--json describes one file; use --jsonl for several");
+  if (args.stream) throw UsageError("--stream picks a stream of one file; give one file");
+  AuditOptions options;
+  const unsigned int cores = std::max(1u, std::thread::hardware_concurrency());
+  options.jobs =
+      args.jobs ? static_cast<unsigned int>(ParsePositive("--jobs", *args.jobs, 1024)) : cores;
+  options.measure = args.measure;
+  options.jsonl = args.jsonl;
+  options.report = args.report;
+  // The total is known when every path is named on the command line.
+  const std::optional<long long> total =
+      folder ? std::nullopt : std::optional<long long>(static_cast<long long>(args.paths.size()));
+  PathWalk walk(args.paths, std::cin);
+  return RunAudit(walk, options, total);
 }
 
 void RunCodecs(const CodecsArgs& args) {
@@ -596,11 +640,11 @@ int Run(int argc, char** argv) {
   if (name == "subtitle") Show(BuildSubtitle(subtitle), std::nullopt, subtitleFlags.json);
   if (name == "ladder") RunLadder(ladder);
   if (name == "codecs") RunCodecs(codecs);
-  const bool invalid = (name == "diff" && RunDiff(diff)) ||
-                       (name == "validate" && RunValidate(validate)) ||
-                       (name == "probe" && RunProbe(probe));
+  const bool invalid =
+      (name == "diff" && RunDiff(diff)) || (name == "validate" && RunValidate(validate));
+  const int probed = name == "probe" ? RunProbe(probe) : 0;
   if (!std::cout.flush()) return Fail("cannot write to standard output", kLibraryError);
-  return invalid ? kLibraryError : 0;
+  return invalid ? kLibraryError : probed;
 }
 
 }  // namespace
