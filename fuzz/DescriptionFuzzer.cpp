@@ -1,9 +1,9 @@
-// A libFuzzer target that reads its input as a program of calls on four format descriptions,
-// three blobs and a scratch property tree, and checks invariants inside and after every step.
-// Each step is a byte naming an operation, then its arguments; reading past the end yields zeros.
-// The settings come from the inspection library's table (Inspect/Settings.h): its key, parent,
-// type and width drive one Set, one read and one tree-level write for every setting of every
-// kind. A broken invariant, or an exception the call does not document, aborts. Checked:
+// A libFuzzer target that reads its input as a program of calls on four format descriptions and
+// three blobs, and checks invariants inside and after every step. Each step is a byte naming an
+// operation, then its arguments; reading past the end yields zeros. The settings are those of the
+// inspection library's table (Inspect/Settings.h): key, parent, type and width drive one Set, one
+// read and one tree-level write for every setting of every kind. A broken invariant, or an
+// exception the call does not document, aborts. Checked:
 //  - after every step: each root is a container named after its kind, with the metadata child
 //    GetMetadata returns; GetCodecType matches the kind; the private data is the blob last set;
 //    every reference count equals the references the program holds; no counting blob leaks;
@@ -11,22 +11,21 @@
 //    entry, and Exists false for every other setting;
 //  - Set through each typed setter: the value as the table's width keeps it (low 32 bits, sign- or
 //    zero-extended, or all 64) lands under the key in its parent, in place of the first child of
-//    that name or appended last; nothing else changes; Exists is then true and Get returns it; a
-//    Set into a metadata leaf is refused and changes nothing;
+//    that name or appended last, and nothing else changes; Exists is then true and Get returns
+//    it; a Set into a metadata leaf is refused and changes nothing;
 //  - reads: Exists is true exactly when the key's child exists; Get returns a child of the
 //    table's type as the width keeps it (values beyond 32 bits as their low 32 bits), throws
 //    WrongPropertyType for another type and ChildNotFound naming the key for none (the audio
 //    language reads ""); the frame aspect and rate follow from the settings they derive from;
-//  - SetProperty, SetMetadata, the options, the geometry setters and the typed child helpers
-//    store exactly what they are given; a leaf is refused, naming node, type, helper and stack;
+//  - SetProperty (a leaf refused), SetMetadata, the options and the geometry setters store
+//    exactly what they are given;
 //  - Clone compares equal both ways, keeps the runtime entries, drops the private data; Compare
 //    is symmetric and agrees with == and with a digest of the trees computed here; IsCompatible
 //    answers from the geometry or audio format as the widths read them, both ways;
 //  - the bitrate functions refuse other kinds, answer alike, and min <= default <= max;
-//  - PrintPropertyValue prints one line a node, whatever the names and values hold.
+//  - PrintPropertyValue prints one line a node; runtime entries leave the tree alone.
 #include <algorithm>
 #include <array>
-#include <cmath>
 #include <cstdint>
 #include <cstdio>
 #include <cstdlib>
@@ -72,28 +71,29 @@ void Require(bool ok, const char* what) {
   std::abort();
 }
 
+// Whether `call` threw `Error`.
+template <class Error, class Call>
+bool Threw(Call&& call) {
+  try {
+    call();
+  } catch (const Error&) {
+    return true;
+  }
+  return false;
+}
+
 // ---- Reading the program ----
 
 // The keys of every kind's settings, the object names, and texts the library interprets.
 const std::vector<std::string>& Words() {
   static const std::vector<std::string> words = [] {
-    std::vector<std::string> list = {Conf::TAG_OBJECT,
-                                     Video::TAG_FORMAT_CODEC_VIDEO,
-                                     Audio::TAG_FORMAT_CODEC_AUDIO,
-                                     Subtitle::TAG_FORMAT_CODEC_SUBTITLE,
-                                     Codec::TAG_BITRATE_MODE_VBR,
-                                     "",
-                                     "VBR",
-                                     "a.b",
-                                     "..",
-                                     "object_name.x",
-                                     std::string("nul\0byte", 8),
-                                     "\xff\xfe\xc3",
-                                     "\xc3\xa9t\xc3\xa9",
-                                     "eng",
-                                     "Unknown codec",
-                                     "H264",
-                                     "nosuchcodec"};
+    // clang-format off
+    std::vector<std::string> list = {Conf::TAG_OBJECT, Video::TAG_FORMAT_CODEC_VIDEO,
+        Audio::TAG_FORMAT_CODEC_AUDIO, Subtitle::TAG_FORMAT_CODEC_SUBTITLE,
+        Codec::TAG_BITRATE_MODE_VBR, "", "VBR", "a.b", "..", "object_name.x",
+        std::string("nul\0byte", 8), "\xff\xfe\xc3", "\xc3\xa9t\xc3\xa9", "eng", "Unknown codec",
+        "H264", "nosuchcodec"};
+    // clang-format on
     for (const Kind kind : kKinds) {
       for (const auto& setting : Conf::SettingsOf(kind)) {
         if (std::count(list.begin(), list.end(), setting.key) == 0) list.push_back(setting.key);
@@ -106,25 +106,11 @@ const std::vector<std::string>& Words() {
   return words;
 }
 
-constexpr long long kInteresting[] = {0,
-                                      1,
-                                      -1,
-                                      2,
-                                      16,
-                                      23,
-                                      720,
-                                      1080,
-                                      1920,
-                                      48000,
-                                      0x3f,
-                                      65537,
-                                      0x7fffffff,
-                                      -0x7fffffff - 1,
-                                      0x80000000LL,
-                                      0xffffffffLL,
-                                      0x100000000LL,
-                                      0x7fffffffffffffffLL,
-                                      -0x7fffffffffffffffLL - 1};
+// clang-format off
+constexpr long long kInteresting[] = {0, 1, -1, 2, 16, 23, 720, 1080, 1920, 48000, 0x3f, 65537,
+    0x7fffffff, -0x7fffffff - 1, 0x80000000LL, 0xffffffffLL, 0x100000000LL,
+    0x7fffffffffffffffLL, -0x7fffffffffffffffLL - 1};
+// clang-format on
 
 class Program {
  public:
@@ -185,28 +171,24 @@ std::uint64_t Mix(std::uint64_t hash, const std::string& text) {
   return hash;
 }
 
-// A digest of `node` named `name`: its type, value and children in order, computed apart from
-// Property's ==. With an edit, the first child named `key` counts as the digest `child` instead
-// (appended last when there is none, or always with `append`): the digest after a set or append.
-// Comparing digests spares copying whole trees to compare them.
-struct Edit {
-  const std::string* key = nullptr;
-  std::uint64_t child = 0;
-  bool append = false;
-};
-std::uint64_t Digest(const Property& node, const std::string& name, Edit edit = {}) {
+// A digest of `node` named `name`: type, value and children in order, computed apart from
+// Property's ==. With `key`, the first child of that name counts as the digest `child` instead,
+// appended last when there is none: the digest after SetChild(key, ...). Comparing digests
+// spares copying whole trees to compare them.
+std::uint64_t Digest(const Property& node, const std::string& name,
+                     const std::string* key = nullptr, std::uint64_t child = 0) {
   std::uint64_t hash = Mix(Mix(0xcbf29ce484222325ULL, name), node.GetType());
   if (node.GetType() == Tarvek::PropertyTypeBool) hash = Mix(hash, node.GetBool());
   if (node.GetType() == kInt) hash = Mix(hash, static_cast<std::uint64_t>(node.GetInt64()));
   if (node.GetType() == Tarvek::PropertyTypeString) hash = Mix(hash, node.GetString());
   std::size_t count = 0;
-  for (const Property& child : node.GetChildren()) {
-    const bool edited = edit.key != nullptr && !edit.append && child.GetName() == *edit.key;
-    hash = Mix(hash, edited ? edit.child : Digest(child, child.GetName()));
-    edit.key = edited ? nullptr : edit.key;
+  for (const Property& each : node.GetChildren()) {
+    const bool edited = key != nullptr && each.GetName() == *key;
+    hash = Mix(hash, edited ? child : Digest(each, each.GetName()));
+    key = edited ? nullptr : key;
     ++count;
   }
-  if (edit.key != nullptr) hash = Mix(hash, edit.child), ++count;
+  if (key != nullptr) hash = Mix(hash, child), ++count;
   return Mix(hash, count);
 }
 std::uint64_t Digest(const Property& node) { return Digest(node, node.GetName()); }
@@ -237,7 +219,7 @@ struct Slot {
   bool countingData = false;                   // whether that is a CountingBlob
 };
 
-void Assign(Slot& slot, CodecPtr codec, Kind kind) {
+void Assign(Slot& slot, const CodecPtr& codec, Kind kind) {
   slot = Slot{codec, kind, dynamic_cast<Conf::FormatCodecVideo*>(codec.get()),
               dynamic_cast<Audio*>(codec.get()), dynamic_cast<Subtitle*>(codec.get())};
   Require((kind == Kind::Video) == (slot.video != nullptr) &&
@@ -277,8 +259,7 @@ struct Bind {
   static bool Has(const Slot& slot) { return (Of(slot).*Exists)(); }
   static Property Read(const Slot& slot, const std::string& key) {
     const auto value = (Of(slot).*Get)();
-    if constexpr (std::is_enum_v<decltype(value)>)
-      return Property(key, static_cast<long long>(value));
+    if constexpr (std::is_enum_v<decltype(value)>) return Property(key, +value);
     if constexpr (!std::is_enum_v<decltype(value)>) return Property(key, value);
   }
   static void Write(Slot& slot, const Property& value) {
@@ -358,47 +339,35 @@ const std::vector<Entry>& EntriesOf(Kind kind) {
   return all[static_cast<std::size_t>(kind)];
 }
 
-long long Narrow(Conf::ValueRange range, long long value) {
-  if (range == Conf::ValueRange::Signed32) return static_cast<std::int32_t>(value);
-  if (range == Conf::ValueRange::Unsigned32) return static_cast<std::uint32_t>(value);
-  return value;
-}
-
-// `value` under the setting's key, as the setting's width keeps an integer.
+// `value` under the setting's key, an integer as the setting's width keeps it.
 Property Stored(const Conf::Setting& setting, const Property& value) {
   Property stored(setting.key);
   stored = value;
-  if (value.GetType() == kInt) stored = Narrow(setting.range, value.GetInt64());
+  const long long wide = value.GetType() == kInt ? value.GetInt64() : 0;
+  if (setting.range == Conf::ValueRange::Signed32) stored = static_cast<std::int32_t>(wide);
+  if (setting.range == Conf::ValueRange::Unsigned32) stored = static_cast<std::uint32_t>(wide);
   return stored;
 }
 
-// The value of integer setting `key` under `root` as `kind`'s table narrows it.
-long long Narrowed(const Property& root, Kind kind, const std::string& key) {
-  for (const Entry& entry : EntriesOf(kind)) {
-    if (entry.setting->key == key) return Narrow(entry.setting->range, root[key].GetInt64());
+// Integer setting `key` of `slot`'s tree as its accessor reads it.
+std::uint64_t Read(const Slot& slot, const std::string& key) {
+  const Property& root = slot.codec->GetProperty();
+  for (const Entry& entry : EntriesOf(slot.kind)) {
+    if (entry.setting->key == key) {
+      return static_cast<std::uint64_t>(Stored(*entry.setting, root[key]).GetInt64());
+    }
   }
   return 0;
 }
 
-// Whether the integer settings `keys` all read under `root`; else 1 for a missing one, 2 for
-// one of another type, whichever comes first.
-int Unreadable(const Property& root, std::initializer_list<const std::string*> keys) {
+// Whether the integer settings `keys` all read in `slot`: else 1 for a missing one, 2 for one
+// of another type, whichever comes first.
+int Unreadable(const Slot& slot, std::initializer_list<const std::string*> keys) {
   for (const std::string* key : keys) {
-    const Property* child = Find(root, *key);
+    const Property* child = Find(slot.codec->GetProperty(), *key);
     if (child == nullptr || child->GetType() != kInt) return child == nullptr ? 1 : 2;
   }
   return 0;
-}
-
-// Runs `call`, which must throw `Error` exactly when `fails`.
-template <class Error, class Call>
-void Throws(bool fails, Call&& call, const char* what) {
-  try {
-    call();
-  } catch (const Error&) {
-    return Require(fails, what);
-  }
-  Require(!fails, what);
 }
 
 // Exists and Get of one setting against the tree. A missing setting is read only when `missing`
@@ -420,14 +389,11 @@ void CheckRead(const Slot& slot, const Entry& entry, bool missing) {
       const auto* key = boost::get_error_info<Core::ChildNotFound::ChildNameInfo>(error);
       Require(key != nullptr && *key == setting.key, "ChildNotFound names another key");
     }
+  } else if (child != nullptr && child->GetType() != setting.type) {
+    Require(Threw<Core::WrongPropertyType>([&] { entry.accessor->get(slot, setting.key); }),
+            "a getter read a setting of another type");
   } else if (child != nullptr) {
-    Throws<Core::WrongPropertyType>(
-        child->GetType() != setting.type,
-        [&] {
-          Require(entry.accessor->get(slot, setting.key) == Stored(setting, *child),
-                  "a Get misread");
-        },
-        "a getter read a setting of another type");
+    Require(entry.accessor->get(slot, setting.key) == Stored(setting, *child), "a Get misread");
   }
 }
 
@@ -440,24 +406,19 @@ std::pair<std::uint64_t, std::uint64_t> Reduced(std::uint64_t a, std::uint64_t b
 
 // The frame aspect and frame rate against the settings they derive from, when those read.
 void CheckDerived(const Slot& slot) {
-  const Property& root = slot.codec->GetProperty();
-  const auto at = [&](const std::string& key) {
-    return static_cast<std::uint64_t>(Narrowed(root, Kind::Video, key));
-  };
-  if (Unreadable(root, {&Video::TAG_ASPECTX, &Video::TAG_WIDTH, &Video::TAG_ASPECTY,
-                        &Video::TAG_HEIGHT}) == 0) {
-    const auto [x, y] = Reduced(at(Video::TAG_WIDTH), at(Video::TAG_ASPECTX), at(Video::TAG_HEIGHT),
-                                at(Video::TAG_ASPECTY));
+  using V = Video;
+  if (Unreadable(slot, {&V::TAG_ASPECTX, &V::TAG_WIDTH, &V::TAG_ASPECTY, &V::TAG_HEIGHT}) == 0) {
+    const auto [x, y] = Reduced(Read(slot, V::TAG_WIDTH), Read(slot, V::TAG_ASPECTX),
+                                Read(slot, V::TAG_HEIGHT), Read(slot, V::TAG_ASPECTY));
     const double ratio = slot.video->GetFrameAspect();
     Require(slot.video->GetFrameAspectX() == x && slot.video->GetFrameAspectY() == y &&
                 (ratio == static_cast<double>(x) / static_cast<double>(y) || (x | y) == 0),
             "the frame aspect is not the reduced product");
   }
-  if (Unreadable(root, {&Video::TAG_TIMEBASE_D, &Video::TAG_TIMEBASE_N}) == 0) {
-    const auto den = static_cast<double>(at(Video::TAG_TIMEBASE_D));
-    Require(slot.video->GetFrameRate() ==
-                (den == 0 ? 0.0 : static_cast<double>(at(Video::TAG_TIMEBASE_N)) / den),
-            "GetFrameRate is not Num / Den");
+  if (Unreadable(slot, {&V::TAG_TIMEBASE_D, &V::TAG_TIMEBASE_N}) == 0) {
+    const auto den = static_cast<double>(Read(slot, V::TAG_TIMEBASE_D));
+    const auto num = static_cast<double>(Read(slot, V::TAG_TIMEBASE_N));
+    Require(slot.video->GetFrameRate() == (den == 0 ? 0.0 : num / den), "the frame rate is off");
   }
 }
 
@@ -467,7 +428,6 @@ struct State {
   Slot slots[kSlots];
   BlobPtr blobs[kBlobs];
   bool counting[kBlobs] = {};
-  Property scratch{"scratch"};
 };
 
 void Create(Slot& slot, Kind kind) {
@@ -545,15 +505,11 @@ void OpSet(State& state, Program& program) {
   const Property& root = slot.codec->GetProperty();
   const Property& parent = setting.parent.empty() ? root : root[setting.parent];
   const bool writable = parent.GetType() == kContainer;
-  const Edit edit = {&setting.key, Digest(stored)};
-  const std::uint64_t expected =
-      !writable ? Digest(root)
-      : setting.parent.empty()
-          ? Digest(root, root.GetName(), edit)
-          : Digest(root, root.GetName(), {&setting.parent, Digest(parent, setting.parent, edit)});
-  Throws<Core::MethodIsNotApplicable>(
-      !writable, [&] { entry.accessor->set(slot, value); },
-      "a Set into a leaf was taken, or a Set refused");
+  std::uint64_t expected = Digest(parent, parent.GetName(), &setting.key, Digest(stored));
+  if (&parent != &root) expected = Digest(root, root.GetName(), &setting.parent, expected);
+  if (!writable) expected = Digest(root);
+  Require(Threw<Core::MethodIsNotApplicable>([&] { entry.accessor->set(slot, value); }) != writable,
+          "a Set into a leaf was taken, or a Set refused");
   Require(Digest(root) == expected, "a Set changed other than its own setting");
   Require(!writable ||
               (entry.accessor->exists(slot) && entry.accessor->get(slot, setting.key) == stored),
@@ -565,7 +521,7 @@ void OpRead(State& state, Program& program) {
   const Slot& slot = Pick(state, program);
   const auto& entries = EntriesOf(slot.kind);
   const std::size_t selector = program.Byte();
-  if (selector < 0x80) return CheckRead(slot, entries[selector % entries.size()], true);
+  if (selector < 0x20) return CheckRead(slot, entries[selector % entries.size()], true);
   for (const Entry& entry : entries) CheckRead(slot, entry, false);
   if (slot.kind == Kind::Video) CheckDerived(slot);
   const Codec& codec = *slot.codec;
@@ -606,24 +562,23 @@ void OpVideoGeometry(State& state, Program& program) {
   for (unsigned& v : value) v = static_cast<unsigned>(program.Integer());
   const auto [a, b, x, y] = value;
   Property expected(slot.codec->GetProperty());
-  const auto put = [&](const std::string& key, long long v) { expected.SetChildT(key, v); };
   const std::size_t which = program.Below(3);
   if (which == 0) slot.video->SetFrameRate(a, b);
   if (which == 1) slot.video->InitByPixelAspect(a, b, x, y);
   if (which == 2) slot.video->InitByFrameAspect(a, b, x, y);
   const auto [aspectX, aspectY] =
       which == 2 ? Reduced(x, b, y, a) : std::pair<std::uint64_t, std::uint64_t>(x, y);
-  put(which == 0 ? Video::TAG_TIMEBASE_N : Video::TAG_WIDTH, a);
-  put(which == 0 ? Video::TAG_TIMEBASE_D : Video::TAG_HEIGHT, b);
-  if (which != 0) put(Video::TAG_ASPECTX, static_cast<long long>(aspectX));
-  if (which != 0) put(Video::TAG_ASPECTY, static_cast<long long>(aspectY));
+  expected.SetChildT<long long>(which == 0 ? Video::TAG_TIMEBASE_N : Video::TAG_WIDTH, a);
+  expected.SetChildT<long long>(which == 0 ? Video::TAG_TIMEBASE_D : Video::TAG_HEIGHT, b);
+  if (which != 0) expected.SetChildT(Video::TAG_ASPECTX, static_cast<long long>(aspectX));
+  if (which != 0) expected.SetChildT(Video::TAG_ASPECTY, static_cast<long long>(aspectY));
   Require(slot.codec->GetProperty() == expected, "a geometry write stored other values");
   CheckDerived(slot);
 }
 
-// A tree to hand in: a description's tree or a sub-tree of one, the scratch tree, or a new one.
+// A tree to hand in: a description's tree or a sub-tree of one, or a new one.
 const Property& PickTree(State& state, Program& program, Property& built) {
-  const std::size_t which = program.Below(10);
+  const std::size_t which = program.Below(8);
   if (which == 0) return Pick(state, program).codec->GetProperty();
   if (which == 1) return Pick(state, program).codec->GetMetadata();
   if (which == 2) {
@@ -631,7 +586,6 @@ const Property& PickTree(State& state, Program& program, Property& built) {
     const Property* child = Find(root, program.Text());
     if (child != nullptr) return *child;
   }
-  if (which == 3) return state.scratch;
   std::size_t budget = kMaxNodes / 4;
   return built = BuildTree(program, 0, budget);
 }
@@ -649,20 +603,16 @@ void OpSetTree(State& state, Program& program) {
                                         : Conf::IFormat::TAG_METADATA;
   const bool refused = which == 0 && source.GetType() != kContainer;
   const Property* metadata = Find(source, key);
-  const std::uint64_t expected =
-      refused      ? Digest(root)
-      : which == 0 ? Digest(source, root.GetName(),
-                            {&key, metadata ? Digest(*metadata) : Digest(Property(key))})
-                   : Digest(root, root.GetName(), {&key, Digest(source, key)});
-  Throws<Core::MethodIsNotApplicable>(
-      refused,
-      [&] {
-        if (which == 0) codec.SetProperty(source);
-        if (which == 1) codec.SetMetadata(source);
-        if (which == 2) codec.SetOptionsEncode(source);
-        if (which == 3) codec.SetOptionsAnalyze(source);
-      },
-      "SetProperty took a leaf, or refused a container");
+  const std::uint64_t kept = metadata != nullptr ? Digest(*metadata) : Digest(Property(key));
+  std::uint64_t expected = Digest(root, root.GetName(), &key, Digest(source, key));
+  if (which == 0) expected = refused ? Digest(root) : Digest(source, root.GetName(), &key, kept);
+  Require(Threw<Core::MethodIsNotApplicable>([&] {
+            if (which == 0) codec.SetProperty(source);
+            if (which == 1) codec.SetMetadata(source);
+            if (which == 2) codec.SetOptionsEncode(source);
+            if (which == 3) codec.SetOptionsAnalyze(source);
+          }) == refused,
+          "SetProperty took a leaf, or a tree was refused");
   Require(Digest(root) == expected, "a tree was stored otherwise");
 }
 
@@ -705,23 +655,18 @@ void OpBlob(State& state, Program& program) {
   const std::size_t other = program.Below(kBlobs);
   state.counting[index] = which == 1 || (which == 2 && state.counting[other]);
   BlobPtr& slot = state.blobs[index];
-  if (which == 0) {
-    const std::string bytes = program.Text();
-    const bool refused = bytes.empty() && program.Flag();  // null data of a size is refused
-    slot.reset();
-    Throws<Core::CoreException>(
-        refused,
-        [&] {
-          slot = Tarvek::CreateBlob(bytes.empty() ? nullptr : bytes.data(), bytes.size() + refused);
-        },
-        "CreateBlob took null data of a size, or refused a blob");
-    Require(refused ||
-                (slot->GetRefCount() == 1 && slot->GetSize() == bytes.size() &&
-                 (bytes.empty() || std::memcmp(slot->GetData(), bytes.data(), bytes.size()) == 0)),
-            "a blob is not what it was made of");
-  }
-  if (which == 1) slot = CountingBlob::Create();
-  if (which >= 2) slot = which == 2 ? BlobPtr(state.blobs[other]) : BlobPtr();
+  slot = which == 1 ? BlobPtr(CountingBlob::Create()) : which == 2 ? state.blobs[other] : BlobPtr();
+  if (which != 0) return;
+  const std::string bytes = program.Text();
+  const bool refused = bytes.empty() && program.Flag();  // null data of a size
+  Require(Threw<Core::CoreException>([&] {
+            slot =
+                Tarvek::CreateBlob(bytes.empty() ? nullptr : bytes.data(), bytes.size() + refused);
+          }) == refused,
+          "CreateBlob took null data of a size, or refused a blob");
+  Require(refused || (slot->GetRefCount() == 1 && slot->GetSize() == bytes.size() &&
+                      (bytes.empty() || !std::memcmp(slot->GetData(), bytes.data(), bytes.size()))),
+          "a blob is not what it was made of");
 }
 
 void OpCompare(State& state, Program& program) {
@@ -749,23 +694,17 @@ void OpIsCompatible(State& state, Program& program) {
   int unreadable = 0;
   bool expected = keys.empty() || sameKind;
   for (std::size_t i = 0; sameKind && expected && unreadable == 0 && i < keys.size(); ++i) {
-    const Property& mine = a.codec->GetProperty();
-    const Property& theirs = b->codec->GetProperty();
-    unreadable = Unreadable(mine, {keys[i]});
-    unreadable = unreadable != 0 ? unreadable : Unreadable(theirs, {keys[i]});
-    expected =
-        unreadable != 0 || Narrowed(mine, a.kind, *keys[i]) == Narrowed(theirs, a.kind, *keys[i]);
+    unreadable = Unreadable(a, {keys[i]});
+    if (unreadable == 0) unreadable = Unreadable(*b, {keys[i]});
+    expected = unreadable != 0 || Read(a, *keys[i]) == Read(*b, *keys[i]);
   }
   const CodecPtr other = b != nullptr ? b->codec : CodecPtr();
   bool got = false;
-  Throws<Core::ChildNotFound>(
-      unreadable == 1,
-      [&] {
-        Throws<Core::WrongPropertyType>(
-            unreadable == 2, [&] { got = a.codec->IsCompatible(other); },
-            "IsCompatible read a setting of another type");
-      },
-      "IsCompatible read a missing setting");
+  const auto call = [&] { got = a.codec->IsCompatible(other); };
+  Require(Threw<Core::ChildNotFound>([&] {
+            Require(Threw<Core::WrongPropertyType>(call) == (unreadable == 2), "a mistyped read");
+          }) == (unreadable == 1),
+          "IsCompatible read a missing setting otherwise");
   Require(
       unreadable != 0 || (got == expected && (!sameKind || other->IsCompatible(a.codec) == got)),
       "IsCompatible gave the wrong answer, or another one the other way");
@@ -808,13 +747,14 @@ void OpBitrate(State& state, Program& program) {
           "the bitrates answer differently, or min <= default <= max broke");
 }
 
-// The tree printer keeps every node on one line, whatever its name and value hold; the
-// runtime entries, which dotted paths nest, change nothing in the tree.
+// The tree printer keeps every node on one line, whatever its name and value hold; runtime
+// entries, which dotted paths nest, change nothing in the tree.
 void OpPrintAndEntries(State& state, Program& program) {
   Codec& codec = *Pick(state, program).codec;
   const int indent = static_cast<std::int8_t>(program.Byte());  // negative too
   const bool recursive = program.Flag();
-  const Property& tree = program.Flag() ? codec.GetProperty() : state.scratch;
+  Property built("");
+  const Property& tree = program.Flag() ? codec.GetProperty() : PickTree(state, program, built);
   std::ostringstream out;
   Core::PrintPropertyValue(tree, indent, out, program.Flag(), recursive);
   const std::string text = out.str();
@@ -828,65 +768,18 @@ void OpPrintAndEntries(State& state, Program& program) {
   if (path.empty() || path.back() == '.') path += 'x';  // the last segment may not be empty
   const std::uint64_t before = Digest(codec.GetProperty());
   const std::string value = program.Text();
-  if (program.Flag()) {
-    entries.put(path, value);
-    Require(entries.get<std::string>(path) == value, "a runtime entry did not read back");
-  } else {
-    entries.erase(path);
-  }
+  if (program.Flag()) entries.erase(path);
+  entries.put(path, value);
+  Require(entries.get<std::string>(path) == value, "a runtime entry did not read back");
   if (entries.size() > 64) entries.clear();  // bounds the work of later steps
   Require(Digest(codec.GetProperty()) == before, "a runtime entry changed the property tree");
 }
 
-// The typed child helpers on the scratch tree or a child of it: set-or-append and append, and a
-// refusal on a leaf that names the node, its type and the helper, and changes nothing.
-void OpChildHelpers(State& state, Program& program) {
-  if (program.Below(6) == 0 || Nodes(state.scratch) >= kMaxNodes) {
-    std::size_t budget = kMaxNodes / 4;
-    return void(state.scratch = BuildTree(program, 0, budget));
-  }
-  Property& scratch = state.scratch;
-  const std::string childName = program.Text();
-  const bool onChild = program.Flag() && scratch.ChildExists(childName);
-  Property& target = onChild ? *scratch.FindChild(childName) : scratch;
-  const std::string name = program.Text();
-  const bool create = program.Flag();
-  const std::size_t type = program.Below(3);
-  Property value(name);
-  if (type == 0) value = program.Flag();
-  if (type == 1) value = program.Integer();
-  if (type == 2) value = program.Text();
-  const bool container = target.GetType() == kContainer;
-  const Edit edit = {&name, Digest(value), create};
-  const std::uint64_t expected =
-      !container ? Digest(scratch)
-      : onChild  ? Digest(scratch, scratch.GetName(), {&childName, Digest(target, childName, edit)})
-                 : Digest(scratch, scratch.GetName(), edit);
-  const auto write = [&](const auto& leaf) {
-    create ? target.CreateChildT(name, leaf) : target.SetChildT(name, leaf);
-  };
-  try {
-    if (type == 0) write(value.GetBool());
-    if (type == 1) write(value.GetInt64());
-    if (type == 2) write(value.GetString());
-    Require(container, "a typed child helper added a child to a leaf");
-  } catch (const Core::MethodIsNotApplicable& e) {
-    using Info = Core::PropertyException;
-    const auto* node = boost::get_error_info<Info::PropertyNameInfo>(e);
-    const auto* method = boost::get_error_info<Info::MethodNameInfo>(e);
-    const auto* of = boost::get_error_info<Info::PropertyTypeInfo>(e);
-    Require(!container && node && *node == target.GetName() && method &&
-                *method == (create ? "CreateChildT" : "SetChildT") && of &&
-                *of == target.GetType() && boost::get_error_info<Tarvek::CallStackInfo>(e),
-            "the refusal names another node, helper or type, or has no call stack");
-  }
-  Require(Digest(scratch) == expected, "a typed child helper changed other than its child");
-}
-
-constexpr void (*kOperations[])(State&, Program&) = {
-    OpSet,     OpSet,          OpRead,    OpStore,           OpVideoGeometry,
-    OpSetTree, OpCreate,       OpClone,   OpPrivateData,     OpBlob,
-    OpCompare, OpIsCompatible, OpBitrate, OpPrintAndEntries, OpChildHelpers};
+// clang-format off
+constexpr void (*kOperations[])(State&, Program&) = {OpSet, OpSet, OpRead, OpStore,
+    OpVideoGeometry, OpSetTree, OpCreate, OpClone, OpPrivateData, OpBlob, OpCompare,
+    OpIsCompatible, OpBitrate, OpPrintAndEntries};
+// clang-format on
 
 }  // namespace
 
