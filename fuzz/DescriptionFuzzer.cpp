@@ -370,9 +370,9 @@ int Unreadable(const Slot& slot, std::initializer_list<const std::string*> keys)
   return 0;
 }
 
-// Exists and Get of one setting against the tree. A missing setting is read only when `missing`
-// says so: each throw records a call stack, and most settings of most descriptions are missing.
-void CheckRead(const Slot& slot, const Entry& entry, bool missing) {
+// Exists and Get of one setting against the tree. A missing or mistyped setting is read only when
+// `failing` says so: each throw records a call stack, and most settings are missing.
+void CheckRead(const Slot& slot, const Entry& entry, bool failing) {
   const Conf::Setting& setting = *entry.setting;
   const Property& root = slot.codec->GetProperty();
   const Property* parent = setting.parent.empty() ? &root : Find(root, setting.parent);
@@ -381,7 +381,7 @@ void CheckRead(const Slot& slot, const Entry& entry, bool missing) {
   if (child == nullptr && !setting.parent.empty()) {
     Require(entry.accessor->get(slot, setting.key) == Property(setting.key, ""),
             "a missing setting in a container did not read as empty");
-  } else if (child == nullptr && missing) {
+  } else if (child == nullptr && failing) {
     try {
       entry.accessor->get(slot, setting.key);
       Require(false, "a getter of a missing setting returned");
@@ -389,10 +389,10 @@ void CheckRead(const Slot& slot, const Entry& entry, bool missing) {
       const auto* key = boost::get_error_info<Core::ChildNotFound::ChildNameInfo>(error);
       Require(key != nullptr && *key == setting.key, "ChildNotFound names another key");
     }
-  } else if (child != nullptr && child->GetType() != setting.type) {
+  } else if (child != nullptr && child->GetType() != setting.type && failing) {
     Require(Threw<Core::WrongPropertyType>([&] { entry.accessor->get(slot, setting.key); }),
             "a getter read a setting of another type");
-  } else if (child != nullptr) {
+  } else if (child != nullptr && child->GetType() == setting.type) {
     Require(entry.accessor->get(slot, setting.key) == Stored(setting, *child), "a Get misread");
   }
 }
@@ -711,7 +711,8 @@ void OpIsCompatible(State& state, Program& program) {
 }
 
 // The three bitrate functions of the description's kind (or, now and then, of another kind or
-// for null, which are refused): they answer alike, and min <= default <= max.
+// for null, which are refused): they answer alike, and min <= default <= max. After a setting
+// that does not read, the other two are not asked (each throw records a call stack).
 void OpBitrate(State& state, Program& program) {
   const std::uint8_t choice = program.Byte();
   const Slot& slot = Pick(state, program);
@@ -725,6 +726,8 @@ void OpBitrate(State& state, Program& program) {
   boost::int64_t figures[3] = {};
   int outcome[3] = {};  // 0 answered, 1 refused by the presets, 2 a setting unreadable
   for (int i = 0; i < 3; ++i) {
+    if (outcome[0] == 2) outcome[i] = 2;
+    if (outcome[0] == 2) continue;
     try {
       figures[i] = kFunctions[video][i](choice == 0 ? CodecPtr() : slot.codec);
       Require(rightKind, "a bitrate function took the wrong kind of description");
