@@ -257,10 +257,12 @@ struct Bind {
     if constexpr (K == Kind::Codec) return *slot.codec;
   }
   static bool Has(const Slot& slot) { return (Of(slot).*Exists)(); }
+  // A libavutil format is converted as it is returned, never held in a variable: it may hold any
+  // value, which the enumeration does not name.
   static Property Read(const Slot& slot, const std::string& key) {
-    const auto value = (Of(slot).*Get)();
-    if constexpr (std::is_enum_v<decltype(value)>) return Property(key, +value);
-    if constexpr (!std::is_enum_v<decltype(value)>) return Property(key, value);
+    using Result = decltype((Of(slot).*Get)());
+    if constexpr (std::is_enum_v<Result>) return Property(key, +(Of(slot).*Get)());
+    if constexpr (!std::is_enum_v<Result>) return Property(key, (Of(slot).*Get)());
   }
   static void Write(Slot& slot, const Property& value) {
     using Arg = std::decay_t<decltype(ArgOf(Set))>;
