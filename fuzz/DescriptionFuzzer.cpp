@@ -1,30 +1,40 @@
-// A libFuzzer target that reads its input as a program of calls on a small set of format
-// descriptions of every kind, blobs and a scratch property tree, and checks after every step that
-// nothing is corrupted.
-//
-// Each step is one byte naming an operation, followed by its arguments (slot numbers, integers,
-// texts, whole trees), all read from the input; reading past the end yields zeros. Exceptions that
-// the library documents for a call are caught by their type and checked against what the trees
-// say; any other exception escapes and aborts, as does a broken invariant. After every step:
-//   - every description has a container root with the metadata child and its object name;
-//   - the reference count of every description and blob equals the references the program holds
-//     (its slots and the descriptions' private data), so no temporary kept one;
-//   - the live harness blobs are exactly those still referenced.
-// Inside the steps: what a Set wrote reads back and the rest of the tree is unchanged, a refused
-// call changes nothing, a clone compares equal to its source, every getter agrees with the tree.
-// Leaks at exit are the leak sanitizer's to report.
+// A libFuzzer target that reads its input as a program of calls on four format descriptions and
+// three blobs, and checks invariants inside and after every step. Each step is a byte naming an
+// operation, then its arguments; reading past the end yields zeros. The settings are those of the
+// inspection library's table (Inspect/Settings.h): key, parent, type and width drive one Set, one
+// read and one tree-level write for every setting of every kind. A broken invariant, or an
+// exception the call does not document, aborts. Checked:
+//  - after every step: each root is a container named after its kind, with the metadata child
+//    GetMetadata returns; GetCodecType matches the kind; the private data is the blob last set;
+//    every reference count equals the references the program holds; no counting blob leaks;
+//  - Create: one reference, codec name "Unknown codec", both option containers, the object name
+//    entry, and Exists false for every other setting;
+//  - Set through each typed setter: the value as the table's width keeps it (low 32 bits, sign- or
+//    zero-extended, or all 64) lands under the key in its parent, in place of the first child of
+//    that name or appended last, and nothing else changes; Exists is then true and Get returns
+//    it; a Set into a metadata leaf is refused and changes nothing;
+//  - reads: Exists is true exactly when the key's child exists; Get returns a child of the
+//    table's type as the width keeps it (values beyond 32 bits as their low 32 bits), throws
+//    WrongPropertyType for another type and ChildNotFound naming the key for none (the audio
+//    language reads ""); the frame aspect and rate follow from the settings they derive from;
+//  - SetProperty (a leaf refused), SetMetadata, the options and the geometry setters store
+//    exactly what they are given;
+//  - Clone compares equal both ways, keeps the runtime entries, drops the private data; Compare
+//    is symmetric and agrees with == and with a digest of the trees computed here; IsCompatible
+//    answers from the geometry or audio format as the widths read them, both ways;
+//  - the bitrate functions refuse other kinds, answer alike, and min <= default <= max;
+//  - PrintPropertyValue prints one line a node; runtime entries leave the tree alone.
 #include <algorithm>
-#include <cmath>
-#include <cstddef>
+#include <array>
 #include <cstdint>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
-#include <iostream>
-#include <map>
+#include <iterator>
 #include <numeric>
 #include <sstream>
 #include <string>
+#include <type_traits>
 #include <vector>
 
 #include <Tarvek/Formats.h>
@@ -40,127 +50,90 @@ namespace Conf = Tarvek::Conf;
 namespace Core = Tarvek::Core;
 using Codec = Conf::IFormatCodec;
 using CodecPtr = boost::intrusive_ptr<Codec>;
-using ConstCodecPtr = boost::intrusive_ptr<const Codec>;
+using BlobPtr = boost::intrusive_ptr<Tarvek::IBlob>;
 using Core::Property;
-using Tarvek::IBlob;
+using Kind = Conf::FormatKind;
+using Video = Conf::IFormatCodecVideo;
+using Audio = Conf::IFormatCodecAudio;
+using Subtitle = Conf::IFormatCodecSubtitle;
+using TarvekTest::CountingBlob;  // counts live instances: a blob freed twice or never shows
 
-constexpr std::size_t kCodecSlots = 6;
-constexpr std::size_t kBlobSlots = 3;
-// Bounds the trees: nesting a description's tree into itself doubles it, and a program of a few
-// thousand bytes must stay fast.
-constexpr std::size_t kMaxNodes = 256;
-constexpr int kMaxBuildDepth = 4;
+constexpr std::size_t kSlots = 4;
+constexpr std::size_t kBlobs = 3;
+constexpr std::size_t kMaxNodes = 256;  // nesting a tree into itself doubles it
+constexpr Kind kKinds[kSlots] = {Kind::Codec, Kind::Video, Kind::Audio, Kind::Subtitle};
+constexpr auto kInt = Tarvek::PropertyTypeInt64;
+constexpr auto kContainer = Tarvek::PropertyTypeContainer;
 
-[[noreturn]] void Fail(const char* what) {
+void Require(bool ok, const char* what) {
+  if (ok) return;
   std::fprintf(stderr, "broken invariant: %s\n", what);
-  std::fflush(stderr);
   std::abort();
 }
 
-void Require(bool ok, const char* what) {
-  if (!ok) Fail(what);
+// Whether `call` threw `Error`.
+template <class Error, class Call>
+bool Threw(Call&& call) {
+  try {
+    call();
+  } catch (const Error&) {
+    return true;
+  }
+  return false;
 }
 
 // ---- Reading the program ----
 
+// The keys of every kind's settings, the object names, and texts the library interprets.
 const std::vector<std::string>& Words() {
   static const std::vector<std::string> words = [] {
-    std::vector<std::string> list = {Conf::IFormat::TAG_METADATA,
-                                     Conf::IFormatCodec::TAG_NAME,
-                                     Conf::IFormatCodec::TAG_CODEC_ID,
-                                     Conf::IFormatCodec::TAG_FOURCC,
-                                     Conf::IFormatCodec::TAG_BITRATE_MODE,
-                                     Conf::IFormatCodec::TAG_BITRATE_MODE_VBR,
-                                     Conf::IFormatCodec::TAG_BITRATE,
-                                     Conf::IFormatCodec::TAG_QUALITY,
-                                     Conf::IFormatCodec::TAG_LOSSLESS,
-                                     Conf::IFormatCodec::TAG_THREAD_NUMBER,
-                                     Conf::IFormatCodec::TAG_TWO_PASS_ENCODING,
-                                     Conf::IFormatCodec::TAG_GLOBAL_HEADER,
-                                     Conf::IFormatCodec::TAG_MAIN_STREAM,
-                                     Conf::IFormatCodec::TAG_CODEC_OPTIONS_ENCODE,
-                                     Conf::IFormatCodec::TAG_CODEC_OPTIONS_ANALYZE,
-                                     Conf::IFormatCodec::TAG_LANGUAGE,
-                                     Conf::IFormatCodecVideo::TAG_WIDTH,
-                                     Conf::IFormatCodecVideo::TAG_HEIGHT,
-                                     Conf::IFormatCodecVideo::TAG_ASPECTX,
-                                     Conf::IFormatCodecVideo::TAG_ASPECTY,
-                                     Conf::IFormatCodecVideo::TAG_TIMEBASE_N,
-                                     Conf::IFormatCodecVideo::TAG_TIMEBASE_D,
-                                     Conf::IFormatCodecVideo::TAG_PIX_FMT,
-                                     Conf::IFormatCodecVideo::TAG_FORMAT_CODEC_VIDEO,
-                                     Conf::IFormatCodecAudio::TAG_SAMPLE_RATE,
-                                     Conf::IFormatCodecAudio::TAG_LAYOUT,
-                                     Conf::IFormatCodecAudio::TAG_FRAME_SIZE,
-                                     Conf::IFormatCodecAudio::TAG_SAMPLE_FORMAT,
-                                     Conf::IFormatCodecAudio::TAG_FORMAT_CODEC_AUDIO,
-                                     Conf::IFormatCodecSubtitle::TAG_SUBTITLE_AUTHOR,
-                                     Conf::IFormatCodecSubtitle::TAG_SUBTITLE_HEADER,
-                                     Conf::IFormatCodecSubtitle::TAG_DVB_WIDTH,
-                                     Conf::IFormatCodecSubtitle::TAG_DVB_HEIGHT,
-                                     Conf::IFormatCodecSubtitle::TAG_FORMAT_CODEC_SUBTITLE,
-                                     Conf::IFormatFile::TAG_TITLE,
-                                     Conf::TAG_OBJECT,
-                                     "",
-                                     "VBR",
-                                     "a.b",
-                                     "..",
-                                     "object_name.x",
-                                     std::string("nul\0byte", 8),
-                                     "\xff\xfe\xc3",
-                                     "\xc3\xa9t\xc3\xa9",
-                                     "eng",
-                                     "Unknown codec"};
+    // clang-format off
+    std::vector<std::string> list = {Conf::TAG_OBJECT, Video::TAG_FORMAT_CODEC_VIDEO,
+        Audio::TAG_FORMAT_CODEC_AUDIO, Subtitle::TAG_FORMAT_CODEC_SUBTITLE,
+        Codec::TAG_BITRATE_MODE_VBR, "", "VBR", "a.b", "..", "object_name.x",
+        std::string("nul\0byte", 8), "\xff\xfe\xc3", "\xc3\xa9t\xc3\xa9", "eng", "Unknown codec",
+        "H264", "nosuchcodec"};
+    // clang-format on
+    for (const Kind kind : kKinds) {
+      for (const auto& setting : Conf::SettingsOf(kind)) {
+        if (std::count(list.begin(), list.end(), setting.key) == 0) list.push_back(setting.key);
+      }
+    }
     for (const auto& id : Conf::GetPresetVideoCodecs()) list.push_back(id);
     for (const auto& id : Conf::GetPresetAudioCodecs()) list.push_back(id);
-    list.push_back("H264");
-    list.push_back("nosuchcodec");
     return list;
   }();
   return words;
 }
 
 // clang-format off
-constexpr long long kInteresting[] = {
-    0, 1, -1, 2, 9, 16, 23, 25,                                       // small
-    720, 576, 1080, 1920, 44100, 48000, 0x3, 0x3f, 65536, 65537,      // sizes, rates, masks
-    0x7fffffff, -0x7fffffff - 1, 0x80000000LL, 0xffffffffLL, 0x100000000LL,  // 32-bit edges
-    0x7fffffffffffffffLL, -0x7fffffffffffffffLL - 1};                 // 64-bit edges
+constexpr long long kInteresting[] = {0, 1, -1, 2, 16, 23, 720, 1080, 1920, 48000, 0x3f, 65537,
+    0x7fffffff, -0x7fffffff - 1, 0x80000000LL, 0xffffffffLL, 0x100000000LL,
+    0x7fffffffffffffffLL, -0x7fffffffffffffffLL - 1};
 // clang-format on
 
 class Program {
  public:
   Program(const std::uint8_t* data, std::size_t size) : data_(data), size_(size) {}
-
   bool Done() const { return position_ >= size_; }
-
   std::uint8_t Byte() { return position_ < size_ ? data_[position_++] : 0; }
   bool Flag() { return (Byte() & 1) != 0; }
   std::size_t Below(std::size_t count) { return Byte() % count; }
-
   // Extremes and common values from a table, or 1, 4 or 8 raw bytes.
   long long Integer() {
     const std::uint8_t form = Byte();
-    switch (form % 4) {
-      case 0:
-        return kInteresting[(form / 4) % (sizeof kInteresting / sizeof kInteresting[0])];
-      case 1:
-        return static_cast<std::int8_t>(Byte());
-      case 2:
-        return static_cast<std::int32_t>(static_cast<std::uint32_t>(Raw(4)));
-      default:
-        return static_cast<long long>(Raw(8));
-    }
+    if (form % 4 == 0) return kInteresting[(form / 4) % std::size(kInteresting)];
+    if (form % 4 == 1) return static_cast<std::int8_t>(Byte());
+    if (form % 4 == 2) return static_cast<std::int32_t>(static_cast<std::uint32_t>(Raw(4)));
+    return static_cast<long long>(Raw(8));
   }
-
-  // A key or codec text from the table, or up to 63 raw bytes (NULs, invalid UTF-8 and all).
+  // A word, or up to 63 raw bytes (NULs, invalid UTF-8 and all).
   std::string Text() {
     const std::uint8_t form = Byte();
     if (form < 0x80) return Words()[form % Words().size()];
     const std::size_t length = std::min<std::size_t>(form & 0x3f, size_ - position_);
-    std::string text(reinterpret_cast<const char*>(data_ + position_), length);
     position_ += length;
-    return text;
+    return std::string(reinterpret_cast<const char*>(data_ + position_ - length), length);
   }
 
  private:
@@ -169,7 +142,6 @@ class Program {
     for (int i = 0; i < bytes; ++i) value |= std::uint64_t{Byte()} << (8 * i);
     return value;
   }
-
   const std::uint8_t* data_;
   std::size_t size_;
   std::size_t position_ = 0;
@@ -189,1031 +161,643 @@ const Property* Find(const Property& container, const std::string& key) {
   return it == container.GetChildren().end() ? nullptr : &*it;
 }
 
-// What SetChildT promises: the first child named `key` takes `value`'s type, value and children,
-// or a child is appended when there is none. Builds expected trees.
-void SetOrAppend(Property& container, const std::string& key, const Property& value) {
-  const auto it = container.FindChild(key);
-  if (it != container.GetChildren().end()) {
-    *it = value;
-  } else {
-    container.CreateChildT<bool>(key, false) = value;
-  }
+std::uint64_t Mix(std::uint64_t hash, std::uint64_t value) {
+  for (int i = 0; i < 64; i += 8) hash = (hash ^ ((value >> i) & 0xff)) * 0x100000001b3ULL;
+  return hash;
+}
+std::uint64_t Mix(std::uint64_t hash, const std::string& text) {
+  hash = Mix(hash, text.size());
+  for (const char c : text) hash = (hash ^ static_cast<unsigned char>(c)) * 0x100000001b3ULL;
+  return hash;
 }
 
-// A tree of the program's choosing: leaves of every type, containers, duplicate and missing
-// keys, a leaf in place of metadata or options.
+// A digest of `node` named `name`: type, value and children in order, computed apart from
+// Property's ==. With `key`, the first child of that name counts as the digest `child` instead,
+// appended last when there is none: the digest after SetChild(key, ...). Comparing digests
+// spares copying whole trees to compare them.
+std::uint64_t Digest(const Property& node, const std::string& name,
+                     const std::string* key = nullptr, std::uint64_t child = 0) {
+  std::uint64_t hash = Mix(Mix(0xcbf29ce484222325ULL, name), node.GetType());
+  if (node.GetType() == Tarvek::PropertyTypeBool) hash = Mix(hash, node.GetBool());
+  if (node.GetType() == kInt) hash = Mix(hash, static_cast<std::uint64_t>(node.GetInt64()));
+  if (node.GetType() == Tarvek::PropertyTypeString) hash = Mix(hash, node.GetString());
+  std::size_t count = 0;
+  for (const Property& each : node.GetChildren()) {
+    const bool edited = key != nullptr && each.GetName() == *key;
+    hash = Mix(hash, edited ? child : Digest(each, each.GetName()));
+    key = edited ? nullptr : key;
+    ++count;
+  }
+  if (key != nullptr) hash = Mix(hash, child), ++count;
+  return Mix(hash, count);
+}
+std::uint64_t Digest(const Property& node) { return Digest(node, node.GetName()); }
+
+// A tree of the program's choosing: leaves of every type, containers, duplicate names.
 Property BuildTree(Program& program, int depth, std::size_t& budget) {
   Property node(program.Text());
   --budget;
-  switch (program.Below(8)) {
-    case 0:
-      node = program.Flag();
-      return node;
-    case 1:
-      node = program.Integer();
-      return node;
-    case 2:
-      node = program.Text();
-      return node;
-    default:
-      break;
-  }
-  const std::size_t children = depth < kMaxBuildDepth ? program.Below(6) : 0;
-  for (std::size_t i = 0; i < children && budget > 0; ++i) {
-    // Appending through CreateChildT keeps duplicate names, which SetChild would merge.
+  const std::size_t form = program.Below(8);
+  if (form == 0) node = program.Flag();
+  if (form == 1) node = program.Integer();
+  if (form == 2) node = program.Text();
+  for (std::size_t i = form < 3 || depth > 3 ? 6 : program.Below(6); i < 6 && budget > 0; ++i) {
     node.CreateChildT<bool>(program.Text(), false) = BuildTree(program, depth + 1, budget);
   }
   return node;
 }
 
-// ---- Descriptions ----
+// ---- Descriptions, with their kind and typed interfaces found once ----
 
-enum Kind { kGeneric, kVideo, kAudio, kSubtitle, kAnyKind };
+struct Slot {
+  CodecPtr codec;
+  Kind kind = Kind::Codec;
+  Conf::FormatCodecVideo* video = nullptr;  // the class: width and pixel aspect have setters only
+  Audio* audio = nullptr;
+  Subtitle* subtitle = nullptr;
+  const Tarvek::IBlob* privateData = nullptr;  // what the program set
+  bool countingData = false;                   // whether that is a CountingBlob
+};
 
-Kind KindOf(const Codec& codec) {
-  if (dynamic_cast<const Conf::IFormatCodecVideo*>(&codec) != nullptr) return kVideo;
-  if (dynamic_cast<const Conf::IFormatCodecAudio*>(&codec) != nullptr) return kAudio;
-  if (dynamic_cast<const Conf::IFormatCodecSubtitle*>(&codec) != nullptr) return kSubtitle;
-  return kGeneric;
-}
-
-CodecPtr Create(Kind kind) {
-  switch (kind) {
-    case kVideo:
-      return Conf::FormatCodecVideo::Create();
-    case kAudio:
-      return Conf::FormatCodecAudio::Create();
-    case kSubtitle:
-      return Conf::FormatCodecSubtitle::Create();
-    default:
-      return Conf::FormatCodec::Create();
-  }
+void Assign(Slot& slot, const CodecPtr& codec, Kind kind) {
+  slot = Slot{codec, kind, dynamic_cast<Conf::FormatCodecVideo*>(codec.get()),
+              dynamic_cast<Audio*>(codec.get()), dynamic_cast<Subtitle*>(codec.get())};
+  Require((kind == Kind::Video) == (slot.video != nullptr) &&
+              (kind == Kind::Audio) == (slot.audio != nullptr) &&
+              (kind == Kind::Subtitle) == (slot.subtitle != nullptr),
+          "a description is of another kind");
 }
 
 const std::string& ObjectName(Kind kind) {
-  static const std::string generic;
-  switch (kind) {
-    case kVideo:
-      return Conf::IFormatCodecVideo::TAG_FORMAT_CODEC_VIDEO;
-    case kAudio:
-      return Conf::IFormatCodecAudio::TAG_FORMAT_CODEC_AUDIO;
-    case kSubtitle:
-      return Conf::IFormatCodecSubtitle::TAG_FORMAT_CODEC_SUBTITLE;
-    default:
-      return generic;
-  }
+  static const std::string names[] = {"", Video::TAG_FORMAT_CODEC_VIDEO,
+                                      Audio::TAG_FORMAT_CODEC_AUDIO,
+                                      Subtitle::TAG_FORMAT_CODEC_SUBTITLE};
+  return names[static_cast<int>(kind)];
 }
 
-template <class I>
-const I& As(const Codec& codec) {
-  return dynamic_cast<const I&>(codec);
-}
-template <class I>
-I& As(Codec& codec) {
-  return dynamic_cast<I&>(codec);
-}
+// ---- The settings: the table's entries, each bound to its typed accessors ----
 
-// ---- The settings, as tables: key, kind, storage and the three accessors ----
-
-// How an integer setting is stored and read: 64 bits as they are, or 32 bits sign- or
-// zero-extended (the getter returns the low 32 bits), as the inspection library's table of
-// settings says; the getters are checked against it.
-using Storage = Conf::ValueRange;
-
-Storage StorageOf(Kind kind, const std::string& key) {
-  const Conf::FormatKind of = kind == kVideo      ? Conf::FormatKind::Video
-                              : kind == kAudio    ? Conf::FormatKind::Audio
-                              : kind == kSubtitle ? Conf::FormatKind::Subtitle
-                                                  : Conf::FormatKind::Codec;
-  for (const Conf::Setting& setting : Conf::SettingsOf(of)) {
-    if (setting.key == key) return setting.range;
-  }
-  return Storage::Int64;
-}
-
-long long Narrow(Storage storage, long long value) {
-  switch (storage) {
-    case Storage::Signed32:
-      return static_cast<std::int32_t>(value);
-    case Storage::Unsigned32:
-      return static_cast<long long>(static_cast<std::uint32_t>(value));
-    default:
-      return value;
-  }
-}
-
-struct IntegerSetting {
+struct Accessor {
+  Kind kind;  // Codec: every kind
   const std::string* key;
-  Kind kind;
-  Storage storage;
-  bool (*exists)(const Codec&);
-  long long (*get)(const Codec&);
-  void (*set)(Codec&, long long);
+  bool (*exists)(const Slot&);
+  Property (*get)(const Slot&, const std::string& key);  // the value read, as a leaf
+  void (*set)(Slot&, const Property& value);
 };
 
-struct TextSetting {
-  const std::string* key;
-  Kind kind;
-  bool inMetadata;  // the audio language lives in the metadata child and reads as "" when absent
-  bool (*exists)(const Codec&);
-  std::string (*get)(const Codec&);
-  void (*set)(Codec&, const std::string&);
+template <class C, class A>
+A ArgOf(void (C::*)(A));
+
+template <Kind K, auto Exists, auto Get, auto Set>
+struct Bind {
+  static auto& Of(const Slot& slot) {
+    if constexpr (K == Kind::Video) return *slot.video;
+    if constexpr (K == Kind::Audio) return *slot.audio;
+    if constexpr (K == Kind::Subtitle) return *slot.subtitle;
+    if constexpr (K == Kind::Codec) return *slot.codec;
+  }
+  static bool Has(const Slot& slot) { return (Of(slot).*Exists)(); }
+  // A libavutil format is converted as it is returned, never held in a variable: it may hold any
+  // value, which the enumeration does not name.
+  static Property Read(const Slot& slot, const std::string& key) {
+    using Result = decltype((Of(slot).*Get)());
+    if constexpr (std::is_enum_v<Result>) return Property(key, +(Of(slot).*Get)());
+    if constexpr (!std::is_enum_v<Result>) return Property(key, (Of(slot).*Get)());
+  }
+  static void Write(Slot& slot, const Property& value) {
+    using Arg = std::decay_t<decltype(ArgOf(Set))>;
+    if constexpr (std::is_same_v<Arg, std::string>) (Of(slot).*Set)(value.GetString());
+    if constexpr (std::is_same_v<Arg, bool>) (Of(slot).*Set)(value.GetBool());
+    if constexpr (std::is_enum_v<Arg>) {
+      (Of(slot).*Set)(static_cast<Arg>(static_cast<std::underlying_type_t<Arg>>(value.GetInt64())));
+    }
+    if constexpr (std::is_integral_v<Arg> && !std::is_same_v<Arg, bool>) {
+      (Of(slot).*Set)(static_cast<Arg>(value.GetInt64()));
+    }
+  }
+  static Accessor Make(const std::string& key) { return {K, &key, &Has, &Read, &Write}; }
 };
 
-struct FlagSetting {
-  const std::string* key;
-  bool (*exists)(const Codec&);
-  bool (*get)(const Codec&);
-  void (*set)(Codec&, bool);
+using CodecClass = Codec;
+using VideoClass = Conf::FormatCodecVideo;
+using AudioClass = Audio;
+using SubtitleClass = Subtitle;
+#define TARVEK_ACCESSOR(K, key, Name) \
+  Bind<Kind::K, &K##Class::Exists##Name, &K##Class::Get##Name, &K##Class::Set##Name>::Make(key)
+const Accessor kAccessors[] = {
+    TARVEK_ACCESSOR(Codec, Codec::TAG_NAME, CodecName),
+    TARVEK_ACCESSOR(Codec, Codec::TAG_CODEC_ID, CodecID),
+    TARVEK_ACCESSOR(Codec, Codec::TAG_FOURCC, CodecTag),
+    TARVEK_ACCESSOR(Codec, Codec::TAG_BITRATE_MODE, BitrateMode),
+    TARVEK_ACCESSOR(Codec, Codec::TAG_BITRATE, Bitrate),
+    TARVEK_ACCESSOR(Codec, Codec::TAG_QUALITY, Quality),
+    TARVEK_ACCESSOR(Codec, Codec::TAG_LOSSLESS, Lossless),
+    TARVEK_ACCESSOR(Codec, Codec::TAG_THREAD_NUMBER, ThreadNumber),
+    TARVEK_ACCESSOR(Codec, Codec::TAG_TWO_PASS_ENCODING, TwoPassEncoding),
+    TARVEK_ACCESSOR(Codec, Codec::TAG_GLOBAL_HEADER, GlobalHeader),
+    TARVEK_ACCESSOR(Codec, Codec::TAG_MAIN_STREAM, MainStream),
+    TARVEK_ACCESSOR(Video, Video::TAG_WIDTH, Width),
+    TARVEK_ACCESSOR(Video, Video::TAG_HEIGHT, Height),
+    TARVEK_ACCESSOR(Video, Video::TAG_ASPECTX, PixelAspectX),
+    TARVEK_ACCESSOR(Video, Video::TAG_ASPECTY, PixelAspectY),
+    TARVEK_ACCESSOR(Video, Video::TAG_TIMEBASE_N, FrameRateNum),
+    TARVEK_ACCESSOR(Video, Video::TAG_TIMEBASE_D, FrameRateDen),
+    TARVEK_ACCESSOR(Video, Video::TAG_PIX_FMT, PixelFormat),
+    TARVEK_ACCESSOR(Audio, Codec::TAG_LANGUAGE, Language),
+    TARVEK_ACCESSOR(Audio, Audio::TAG_SAMPLE_RATE, SampleRate),
+    TARVEK_ACCESSOR(Audio, Audio::TAG_LAYOUT, ChannelLayout),
+    TARVEK_ACCESSOR(Audio, Audio::TAG_FRAME_SIZE, FrameSize),
+    TARVEK_ACCESSOR(Audio, Audio::TAG_SAMPLE_FORMAT, SampleFormat),
+    TARVEK_ACCESSOR(Subtitle, Codec::TAG_LANGUAGE, Language),
+    TARVEK_ACCESSOR(Subtitle, Conf::IFormatFile::TAG_TITLE, Title),
+    TARVEK_ACCESSOR(Subtitle, Subtitle::TAG_SUBTITLE_AUTHOR, Author),
+    TARVEK_ACCESSOR(Subtitle, Subtitle::TAG_SUBTITLE_HEADER, SubtitleHeader),
+    TARVEK_ACCESSOR(Subtitle, Subtitle::TAG_DVB_WIDTH, DVBWidth),
+    TARVEK_ACCESSOR(Subtitle, Subtitle::TAG_DVB_HEIGHT, DVBHeight),
+};
+#undef TARVEK_ACCESSOR
+
+struct Entry {
+  const Conf::Setting* setting;
+  const Accessor* accessor;
 };
 
-// One line a setting in the tables below, instead of three lambdas each.
-#define TARVEK_INTEGER(Class, kind, Key, Name, Type)                                     \
-  IntegerSetting {                                                                       \
-    &Class::Key, kind, StorageOf(kind, Class::Key),                                      \
-        [](const Codec& c) { return As<Class>(c).Exists##Name(); },                      \
-        [](const Codec& c) { return static_cast<long long>(As<Class>(c).Get##Name()); }, \
-        [](Codec& c, long long v) { As<Class>(c).Set##Name(static_cast<Type>(v)); }      \
-  }
-
-#define TARVEK_TEXT(Class, kind, key, inMetadata, Name)                                \
-  TextSetting {                                                                        \
-    key, kind, inMetadata, [](const Codec& c) { return As<Class>(c).Exists##Name(); }, \
-        [](const Codec& c) { return As<Class>(c).Get##Name(); },                       \
-        [](Codec& c, const std::string& v) { As<Class>(c).Set##Name(v); }              \
-  }
-
-#define TARVEK_FLAG(Key, Name)                                                                 \
-  FlagSetting {                                                                                \
-    &Codec::Key, [](const Codec& c) { return c.Exists##Name(); },                              \
-        [](const Codec& c) { return c.Get##Name(); }, [](Codec& c, bool v) { c.Set##Name(v); } \
-  }
-
-const std::vector<IntegerSetting>& IntegerSettings() {
-  // The class, not the interface: width, height and pixel aspect have no Set on the interface.
-  using Video = Conf::FormatCodecVideo;
-  using Audio = Conf::IFormatCodecAudio;
-  using Subtitle = Conf::IFormatCodecSubtitle;
-  static const std::vector<IntegerSetting> settings = {
-      TARVEK_INTEGER(Codec, kAnyKind, TAG_FOURCC, CodecTag, long long),
-      TARVEK_INTEGER(Codec, kAnyKind, TAG_BITRATE, Bitrate, long long),
-      TARVEK_INTEGER(Codec, kAnyKind, TAG_QUALITY, Quality, long long),
-      TARVEK_INTEGER(Codec, kAnyKind, TAG_THREAD_NUMBER, ThreadNumber, unsigned),
-      TARVEK_INTEGER(Video, kVideo, TAG_WIDTH, Width, unsigned),
-      TARVEK_INTEGER(Video, kVideo, TAG_HEIGHT, Height, unsigned),
-      TARVEK_INTEGER(Video, kVideo, TAG_ASPECTX, PixelAspectX, unsigned),
-      TARVEK_INTEGER(Video, kVideo, TAG_ASPECTY, PixelAspectY, unsigned),
-      TARVEK_INTEGER(Video, kVideo, TAG_TIMEBASE_N, FrameRateNum, unsigned),
-      TARVEK_INTEGER(Video, kVideo, TAG_TIMEBASE_D, FrameRateDen, unsigned),
-      TARVEK_INTEGER(Video, kVideo, TAG_PIX_FMT, PixelFormat, AVPixelFormat),
-      TARVEK_INTEGER(Audio, kAudio, TAG_SAMPLE_RATE, SampleRate, int),
-      TARVEK_INTEGER(Audio, kAudio, TAG_LAYOUT, ChannelLayout, Conf::ChannelLayout),
-      TARVEK_INTEGER(Audio, kAudio, TAG_FRAME_SIZE, FrameSize, int),
-      TARVEK_INTEGER(Audio, kAudio, TAG_SAMPLE_FORMAT, SampleFormat, AVSampleFormat),
-      TARVEK_INTEGER(Subtitle, kSubtitle, TAG_DVB_WIDTH, DVBWidth, unsigned),
-      TARVEK_INTEGER(Subtitle, kSubtitle, TAG_DVB_HEIGHT, DVBHeight, unsigned),
-  };
-  return settings;
+// The leaf settings of `kind` in the table's order; every one must have its accessors above.
+const std::vector<Entry>& EntriesOf(Kind kind) {
+  static const auto all = [] {
+    std::array<std::vector<Entry>, 4> entries;
+    for (const Kind of : kKinds) {
+      for (const Conf::Setting& setting : Conf::SettingsOf(of)) {
+        const Accessor* found = nullptr;
+        for (const Accessor& a : kAccessors) {
+          if (*a.key == setting.key && (a.kind == Kind::Codec || a.kind == of)) found = &a;
+        }
+        Require(found != nullptr || setting.type == kContainer, "a setting has no accessor");
+        if (found != nullptr) entries[static_cast<std::size_t>(of)].push_back({&setting, found});
+      }
+    }
+    return entries;
+  }();
+  return all[static_cast<std::size_t>(kind)];
 }
 
-const std::vector<TextSetting>& TextSettings() {
-  using Audio = Conf::IFormatCodecAudio;
-  using Subtitle = Conf::IFormatCodecSubtitle;
-  static const std::vector<TextSetting> settings = {
-      TARVEK_TEXT(Codec, kAnyKind, &Codec::TAG_NAME, false, CodecName),
-      TARVEK_TEXT(Codec, kAnyKind, &Codec::TAG_CODEC_ID, false, CodecID),
-      TARVEK_TEXT(Codec, kAnyKind, &Codec::TAG_BITRATE_MODE, false, BitrateMode),
-      TARVEK_TEXT(Audio, kAudio, &Codec::TAG_LANGUAGE, true, Language),
-      TARVEK_TEXT(Subtitle, kSubtitle, &Codec::TAG_LANGUAGE, false, Language),
-      TARVEK_TEXT(Subtitle, kSubtitle, &Conf::IFormatFile::TAG_TITLE, false, Title),
-      TARVEK_TEXT(Subtitle, kSubtitle, &Subtitle::TAG_SUBTITLE_AUTHOR, false, Author),
-      TARVEK_TEXT(Subtitle, kSubtitle, &Subtitle::TAG_SUBTITLE_HEADER, false, SubtitleHeader),
-  };
-  return settings;
+// `value` under the setting's key, an integer as the setting's width keeps it.
+Property Stored(const Conf::Setting& setting, const Property& value) {
+  Property stored(setting.key);
+  stored = value;
+  const long long wide = value.GetType() == kInt ? value.GetInt64() : 0;
+  if (setting.range == Conf::ValueRange::Signed32) stored = static_cast<std::int32_t>(wide);
+  if (setting.range == Conf::ValueRange::Unsigned32) stored = static_cast<std::uint32_t>(wide);
+  return stored;
 }
 
-const std::vector<FlagSetting>& FlagSettings() {
-  static const std::vector<FlagSetting> settings = {
-      TARVEK_FLAG(TAG_LOSSLESS, Lossless),
-      TARVEK_FLAG(TAG_TWO_PASS_ENCODING, TwoPassEncoding),
-      TARVEK_FLAG(TAG_GLOBAL_HEADER, GlobalHeader),
-      TARVEK_FLAG(TAG_MAIN_STREAM, MainStream),
-  };
-  return settings;
+// Integer setting `key` of `slot`'s tree as its accessor reads it.
+std::uint64_t Read(const Slot& slot, const std::string& key) {
+  const Property& root = slot.codec->GetProperty();
+  for (const Entry& entry : EntriesOf(slot.kind)) {
+    if (entry.setting->key == key) {
+      return static_cast<std::uint64_t>(Stored(*entry.setting, root[key]).GetInt64());
+    }
+  }
+  return 0;
 }
 
-#undef TARVEK_INTEGER
-#undef TARVEK_TEXT
-#undef TARVEK_FLAG
-
-template <class Setting>
-bool Applies(const Setting& setting, Kind kind) {
-  return setting.kind == kAnyKind || setting.kind == kind;
+// Whether the integer settings `keys` all read in `slot`: else 1 for a missing one, 2 for one
+// of another type, whichever comes first.
+int Unreadable(const Slot& slot, std::initializer_list<const std::string*> keys) {
+  for (const std::string* key : keys) {
+    const Property* child = Find(slot.codec->GetProperty(), *key);
+    if (child == nullptr || child->GetType() != kInt) return child == nullptr ? 1 : 2;
+  }
+  return 0;
 }
 
-// ---- Reads checked against the tree ----
-
-enum class Outcome { kValue, kMissing, kWrongType };
-
-Outcome Expect(const Property* child, Tarvek::PropertyTypes type) {
-  if (child == nullptr) return Outcome::kMissing;
-  return child->GetType() == type ? Outcome::kValue : Outcome::kWrongType;
-}
-
-// Runs `read` and checks that it fails exactly as `expected` says; true when it gave a value.
-template <class Read>
-bool ReadsAs(Outcome expected, Read&& read) {
-  try {
-    read();
-  } catch (const Core::ChildNotFound&) {
-    Require(expected == Outcome::kMissing, "a getter threw ChildNotFound for a present setting");
-    return false;
-  } catch (const Core::WrongPropertyType&) {
-    Require(expected == Outcome::kWrongType, "a getter threw WrongPropertyType wrongly");
-    return false;
-  }
-  Require(expected == Outcome::kValue, "a getter of a missing or mistyped setting returned");
-  return true;
-}
-
-// The value of integer setting `key` as a 32-bit unsigned getter reads it, with its outcome.
-Outcome ReadUnsigned(const Property& root, const std::string& key, std::uint64_t& value) {
-  const Property* child = Find(root, key);
-  const Outcome outcome = Expect(child, Tarvek::PropertyTypeInt64);
-  value = outcome == Outcome::kValue ? static_cast<std::uint32_t>(child->GetInt64()) : 0;
-  return outcome;
-}
-
-// (a x b) : (c x d) in lowest terms, each term cut to 32 bits: what the frame aspect and
-// InitByFrameAspect compute.
-void ReducedProducts(std::uint64_t a, std::uint64_t b, std::uint64_t c, std::uint64_t d,
-                     std::uint64_t& x, std::uint64_t& y) {
-  x = a * b;
-  y = c * d;
-  const std::uint64_t divisor = std::gcd(x, y);
-  if (divisor > 1) {
-    x /= divisor;
-    y /= divisor;
-  }
-  x = static_cast<std::uint32_t>(x);
-  y = static_cast<std::uint32_t>(y);
-}
-
-bool SameDouble(double a, double b) { return a == b || (std::isnan(a) && std::isnan(b)); }
-
-void CheckVideoDerived(const Conf::IFormatCodecVideo& video) {
-  const Property& root = video.GetProperty();
-  // The frame aspect reads pixel aspect X, width, pixel aspect Y, height: the first that fails
-  // is the one reported.
-  std::uint64_t geometry[4] = {};
-  const std::string* keys[4] = {
-      &Conf::IFormatCodecVideo::TAG_ASPECTX, &Conf::IFormatCodecVideo::TAG_WIDTH,
-      &Conf::IFormatCodecVideo::TAG_ASPECTY, &Conf::IFormatCodecVideo::TAG_HEIGHT};
-  Outcome aspect = Outcome::kValue;
-  for (int i = 0; i < 4 && aspect == Outcome::kValue; ++i) {
-    aspect = ReadUnsigned(root, *keys[i], geometry[i]);
-  }
-  std::uint64_t x = 0;
-  std::uint64_t y = 0;
-  if (aspect == Outcome::kValue) {
-    ReducedProducts(geometry[1], geometry[0], geometry[3], geometry[2], x, y);
-  }
-  unsigned got = 0;
-  if (ReadsAs(aspect, [&] { got = video.GetFrameAspectX(); })) {
-    Require(got == x, "GetFrameAspectX is not the reduced product");
-  }
-  if (ReadsAs(aspect, [&] { got = video.GetFrameAspectY(); })) {
-    Require(got == y, "GetFrameAspectY is not the reduced product");
-  }
-  double ratio = 0.0;
-  if (ReadsAs(aspect, [&] { ratio = video.GetFrameAspect(); })) {
-    Require(SameDouble(ratio, static_cast<double>(x) / static_cast<double>(y)),
-            "GetFrameAspect is not X / Y");
-  }
-
-  // The frame rate reads the denominator, and the numerator only when that is not 0.
-  std::uint64_t den = 0;
-  std::uint64_t num = 0;
-  Outcome rate = ReadUnsigned(root, Conf::IFormatCodecVideo::TAG_TIMEBASE_D, den);
-  if (rate == Outcome::kValue && den != 0) {
-    rate = ReadUnsigned(root, Conf::IFormatCodecVideo::TAG_TIMEBASE_N, num);
-  }
-  if (ReadsAs(rate, [&] { ratio = video.GetFrameRate(); })) {
-    const double expected = den == 0 ? 0.0 : static_cast<double>(num) / static_cast<double>(den);
-    Require(SameDouble(ratio, expected), "GetFrameRate is not Num / Den");
+// Exists and Get of one setting against the tree. A missing or mistyped setting is read only when
+// `failing` says so: each throw records a call stack, and most settings are missing.
+void CheckRead(const Slot& slot, const Entry& entry, bool failing) {
+  const Conf::Setting& setting = *entry.setting;
+  const Property& root = slot.codec->GetProperty();
+  const Property* parent = setting.parent.empty() ? &root : Find(root, setting.parent);
+  const Property* child = parent == nullptr ? nullptr : Find(*parent, setting.key);
+  Require(entry.accessor->exists(slot) == (child != nullptr), "Exists disagrees with the tree");
+  if (child == nullptr && !setting.parent.empty()) {
+    Require(entry.accessor->get(slot, setting.key) == Property(setting.key, ""),
+            "a missing setting in a container did not read as empty");
+  } else if (child == nullptr && failing) {
+    try {
+      entry.accessor->get(slot, setting.key);
+      Require(false, "a getter of a missing setting returned");
+    } catch (const Core::ChildNotFound& error) {
+      const auto* key = boost::get_error_info<Core::ChildNotFound::ChildNameInfo>(error);
+      Require(key != nullptr && *key == setting.key, "ChildNotFound names another key");
+    }
+  } else if (child != nullptr && child->GetType() != setting.type && failing) {
+    Require(Threw<Core::WrongPropertyType>([&] { entry.accessor->get(slot, setting.key); }),
+            "a getter read a setting of another type");
+  } else if (child != nullptr && child->GetType() == setting.type) {
+    Require(entry.accessor->get(slot, setting.key) == Stored(setting, *child), "a Get misread");
   }
 }
 
-void CheckInteger(const Codec& codec, const IntegerSetting& setting) {
-  const Property* child = Find(codec.GetProperty(), *setting.key);
-  Require(setting.exists(codec) == (child != nullptr), "Exists disagrees with the tree");
-  long long got = 0;
-  if (ReadsAs(Expect(child, Tarvek::PropertyTypeInt64), [&] { got = setting.get(codec); })) {
-    Require(got == Narrow(setting.storage, child->GetInt64()), "an integer getter misread");
-  }
+// (a x b) : (c x d) in lowest terms, each term cut to 32 bits: the frame aspect's arithmetic.
+std::pair<std::uint64_t, std::uint64_t> Reduced(std::uint64_t a, std::uint64_t b, std::uint64_t c,
+                                                std::uint64_t d) {
+  const std::uint64_t divisor = std::max<std::uint64_t>(std::gcd(a * b, c * d), 1);
+  return {static_cast<std::uint32_t>(a * b / divisor), static_cast<std::uint32_t>(c * d / divisor)};
 }
 
-void CheckText(const Codec& codec, const TextSetting& setting) {
-  const Property& root = codec.GetProperty();
-  const Property* container = setting.inMetadata ? Find(root, Conf::IFormat::TAG_METADATA) : &root;
-  const Property* child = container == nullptr ? nullptr : Find(*container, *setting.key);
-  Require(setting.exists(codec) == (child != nullptr), "Exists disagrees with the tree");
-  Outcome outcome = Expect(child, Tarvek::PropertyTypeString);
-  if (setting.inMetadata && outcome == Outcome::kMissing) outcome = Outcome::kValue;
-  std::string got;
-  if (ReadsAs(outcome, [&] { got = setting.get(codec); })) {
-    Require(got == (child == nullptr ? std::string() : child->GetString()),
-            "a text getter misread");
+// The frame aspect and frame rate against the settings they derive from, when those read.
+void CheckDerived(const Slot& slot) {
+  using V = Video;
+  if (Unreadable(slot, {&V::TAG_ASPECTX, &V::TAG_WIDTH, &V::TAG_ASPECTY, &V::TAG_HEIGHT}) == 0) {
+    const auto [x, y] = Reduced(Read(slot, V::TAG_WIDTH), Read(slot, V::TAG_ASPECTX),
+                                Read(slot, V::TAG_HEIGHT), Read(slot, V::TAG_ASPECTY));
+    const double ratio = slot.video->GetFrameAspect();
+    Require(slot.video->GetFrameAspectX() == x && slot.video->GetFrameAspectY() == y &&
+                (ratio == static_cast<double>(x) / static_cast<double>(y) || (x | y) == 0),
+            "the frame aspect is not the reduced product");
   }
-}
-
-void CheckFlag(const Codec& codec, const FlagSetting& setting) {
-  const Property* child = Find(codec.GetProperty(), *setting.key);
-  Require(setting.exists(codec) == (child != nullptr), "Exists disagrees with the tree");
-  bool got = false;
-  if (ReadsAs(Expect(child, Tarvek::PropertyTypeBool), [&] { got = setting.get(codec); })) {
-    Require(got == child->GetBool(), "a flag getter misread");
+  if (Unreadable(slot, {&V::TAG_TIMEBASE_D, &V::TAG_TIMEBASE_N}) == 0) {
+    const auto den = static_cast<double>(Read(slot, V::TAG_TIMEBASE_D));
+    const auto num = static_cast<double>(Read(slot, V::TAG_TIMEBASE_N));
+    Require(slot.video->GetFrameRate() == (den == 0 ? 0.0 : num / den), "the frame rate is off");
   }
-}
-
-void CheckOptions(const Codec& codec, bool encode) {
-  const Property* child = Find(codec.GetProperty(), encode ? Codec::TAG_CODEC_OPTIONS_ENCODE
-                                                           : Codec::TAG_CODEC_OPTIONS_ANALYZE);
-  Require(
-      (encode ? codec.ExistsOptionsEncode() : codec.ExistsOptionsAnalyze()) == (child != nullptr),
-      "ExistsOptions disagrees with the tree");
-  const Property* got = nullptr;
-  if (ReadsAs(child == nullptr ? Outcome::kMissing : Outcome::kValue,
-              [&] { got = encode ? &codec.GetOptionsEncode() : &codec.GetOptionsAnalyze(); })) {
-    Require(got == child, "GetOptions is not the options child");
-  }
-}
-
-// Getters and Exists of `codec` against its tree: the one `selector` names, or all of them for
-// the last selector. (Every missing setting costs an error with its call stack, so a step that
-// reads everything is slow.)
-void CheckReads(const Codec& codec, std::size_t selector) {
-  const Kind kind = KindOf(codec);
-  const auto& integers = IntegerSettings();
-  const auto& texts = TextSettings();
-  const auto& flags = FlagSettings();
-  const std::size_t count = integers.size() + texts.size() + flags.size() + 3;
-  selector %= count + 1;
-  const bool all = selector == count;
-  std::size_t index = 0;
-  const auto chosen = [&] { return all || index++ == selector; };
-  for (const IntegerSetting& setting : integers) {
-    if (chosen() && Applies(setting, kind)) CheckInteger(codec, setting);
-  }
-  for (const TextSetting& setting : texts) {
-    if (chosen() && Applies(setting, kind)) CheckText(codec, setting);
-  }
-  for (const FlagSetting& setting : flags) {
-    if (chosen()) CheckFlag(codec, setting);
-  }
-  if (chosen()) CheckOptions(codec, true);
-  if (chosen()) CheckOptions(codec, false);
-  if (chosen() && kind == kVideo) CheckVideoDerived(As<Conf::IFormatCodecVideo>(codec));
-}
-
-// ---- Writes checked against the tree ----
-
-// Runs `set`, which writes `value` under `key` of the root or of the metadata child, and checks
-// that exactly that changed, or that a refusal (only for a leaf container) changed nothing.
-template <class Set>
-bool CheckedSet(Codec& codec, bool inMetadata, const Property& value, Set&& set) {
-  const Property before(codec.GetProperty());
-  Property expected(before);
-  Property* container = &expected;
-  if (inMetadata) container = &*expected.FindChild(Conf::IFormat::TAG_METADATA);
-  const bool writable = container->GetType() == Tarvek::PropertyTypeContainer;
-  if (writable) SetOrAppend(*container, value.GetName(), value);
-  try {
-    set();
-  } catch (const Core::MethodIsNotApplicable&) {
-    Require(!writable, "a Set into a container was refused");
-    Require(codec.GetProperty() == before, "a refused Set changed the description");
-    return false;
-  }
-  Require(writable, "a Set into a leaf succeeded");
-  Require(codec.GetProperty() == expected, "a Set changed more than its own setting");
-  return true;
 }
 
 // ---- The program's state ----
 
-using TarvekTest::CountingBlob;  // counts live instances: a blob freed twice or never shows
-
 struct State {
-  CodecPtr codecs[kCodecSlots];
-  boost::intrusive_ptr<IBlob> blobs[kBlobSlots];
-  // The blob each live description holds as private data, as the program set it.
-  std::map<const Codec*, const IBlob*> privateData;
-  Property scratch{"scratch"};
+  Slot slots[kSlots];
+  BlobPtr blobs[kBlobs];
+  bool counting[kBlobs] = {};
 };
 
-CodecPtr& PickCodec(State& state, Program& program) {
-  return state.codecs[program.Below(kCodecSlots)];
+void Create(Slot& slot, Kind kind) {
+  static CodecPtr (*const kCreate[])() = {
+      [] { return Conf::FormatCodec::Create(); },
+      [] { return CodecPtr(Conf::FormatCodecVideo::Create()); },
+      [] { return CodecPtr(Conf::FormatCodecAudio::Create()); },
+      [] { return CodecPtr(Conf::FormatCodecSubtitle::Create()); }};
+  Assign(slot, kCreate[static_cast<int>(kind)](), kind);
+  const Codec& codec = *slot.codec;
+  Require(codec.GetRefCount() == 1 && codec.GetCodecName() == "Unknown codec" &&
+              codec.ExistsOptionsEncode() && codec.ExistsOptionsAnalyze() &&
+              codec.GetInternalProperties().get<std::string>(Conf::TAG_OBJECT) == ObjectName(kind),
+          "a new description is not as Create promises");
+  for (const Entry& entry : EntriesOf(kind)) {
+    Require(entry.accessor->exists(slot) == (entry.setting->key == Codec::TAG_NAME),
+            "a new description has a setting besides its codec name");
+  }
 }
 
-void CheckState(State& state) {
-  // Forget the private data of descriptions no slot holds any more: they are gone.
-  for (auto it = state.privateData.begin(); it != state.privateData.end();) {
-    bool held = false;
-    for (const CodecPtr& codec : state.codecs) held = held || codec.get() == it->first;
-    it = held ? std::next(it) : state.privateData.erase(it);
-  }
-  std::map<const Tarvek::IRefCountable*, int> expected;
-  for (const CodecPtr& codec : state.codecs) {
-    Require(codec != nullptr, "a slot lost its description");
-    ++expected[codec.get()];
-  }
-  for (const auto& blob : state.blobs) {
-    if (blob) ++expected[blob.get()];
-  }
-  for (const auto& [codec, blob] : state.privateData) {
-    if (blob != nullptr) ++expected[blob];
-  }
+// A slot of the program's choosing, its description made on first use.
+Slot& Pick(State& state, Program& program) {
+  const std::size_t index = program.Below(kSlots);
+  if (!state.slots[index].codec) Create(state.slots[index], kKinds[index]);
+  return state.slots[index];
+}
+
+void CheckState(const State& state) {
+  const Tarvek::IRefCountable* objects[kSlots * 2 + kBlobs] = {};
+  int counts[kSlots * 2 + kBlobs] = {};
+  std::size_t distinct = 0;
   int countingBlobs = 0;
-  for (const auto& [object, count] : expected) {
-    countingBlobs += dynamic_cast<const CountingBlob*>(object) != nullptr ? 1 : 0;
+  const auto held = [&](const Tarvek::IRefCountable* object, bool counting) {
+    std::size_t i = 0;
+    while (i < distinct && objects[i] != object) ++i;
+    if (i == distinct) objects[distinct++] = object, countingBlobs += counting;
+    ++counts[i];
+  };
+  for (std::size_t i = 0; i < kBlobs; ++i) {
+    if (state.blobs[i]) held(state.blobs[i].get(), state.counting[i]);
+  }
+  for (std::size_t i = 0; i < kSlots; ++i) {
+    const Slot& slot = state.slots[i];
+    if (!slot.codec) continue;
+    bool first = true;  // a description in two slots holds its private data once
+    for (std::size_t j = 0; j < i; ++j) first = first && state.slots[j].codec != slot.codec;
+    if (first && slot.privateData != nullptr) held(slot.privateData, slot.countingData);
+    held(slot.codec.get(), false);
+    const Property& root = slot.codec->GetProperty();
+    static constexpr int kTypes[] = {-1, 0, 1, 3};
+    Require(root.GetType() == kContainer && root.GetName() == ObjectName(slot.kind) &&
+                &slot.codec->GetMetadata() == Find(root, Conf::IFormat::TAG_METADATA) &&
+                slot.codec->GetCodecType() == kTypes[static_cast<int>(slot.kind)] &&
+                slot.codec->GetPrivateData().get() == slot.privateData,
+            "a root, its metadata, the codec type or the private data is off");
   }
   Require(CountingBlob::Live() == countingBlobs, "a blob was freed early or leaked");
-
-  for (const CodecPtr& codec : state.codecs) {
-    const Kind kind = KindOf(*codec);
-    const Property& root = codec->GetProperty();
-    Require(root.GetType() == Tarvek::PropertyTypeContainer, "the root is not a container");
-    Require(root.GetName() == ObjectName(kind), "the root lost the object name");
-    const Property* metadata = Find(root, Conf::IFormat::TAG_METADATA);
-    Require(metadata != nullptr, "the metadata child is missing");
-    Require(&codec->GetMetadata() == metadata, "GetMetadata is not the metadata child");
-    static constexpr int kTypes[] = {-1, 0, 1, 3};
-    Require(codec->GetCodecType() == kTypes[kind], "the codec type does not match the kind");
-    const auto model = state.privateData.find(codec.get());
-    const IBlob* held = model == state.privateData.end() ? nullptr : model->second;
-    Require(codec->GetPrivateData().get() == held, "the private data is not what was set");
-  }
-  for (const auto& [object, count] : expected) {
-    Require(object->GetRefCount() == count, "a reference count is off");
+  for (std::size_t i = 0; i < distinct; ++i) {
+    Require(objects[i]->GetRefCount() == counts[i], "a reference count is off");
   }
 }
 
 // ---- Operations ----
 
-// A tree to hand to SetProperty, SetMetadata or the options: built from the program, or a tree
-// or sub-tree of a description (the target's own included) or the scratch tree.
-const Property& PickTree(State& state, Program& program, Property& built) {
-  switch (program.Below(10)) {
-    case 0:
-      return PickCodec(state, program)->GetProperty();
-    case 1:
-      return PickCodec(state, program)->GetMetadata();
-    case 2: {
-      const Property& root = PickCodec(state, program)->GetProperty();
-      const Property* child = Find(root, program.Text());
-      if (child != nullptr) return *child;
-      break;
-    }
-    case 3:
-      return state.scratch;
-    default:
-      break;
-  }
-  std::size_t budget = kMaxNodes / 4;
-  built = BuildTree(program, 0, budget);
-  return built;
+// Set of one setting through its typed setter, checked against the tree's digest.
+void OpSet(State& state, Program& program) {
+  Slot& slot = Pick(state, program);
+  const Entry& entry = EntriesOf(slot.kind)[program.Below(EntriesOf(slot.kind).size())];
+  const Conf::Setting& setting = *entry.setting;
+  Property value(setting.key);
+  if (setting.type == Tarvek::PropertyTypeString) value = program.Text();
+  if (setting.type == Tarvek::PropertyTypeBool) value = program.Flag();
+  if (setting.type == kInt) value = program.Integer();
+  const Property stored = Stored(setting, value);
+  const Property& root = slot.codec->GetProperty();
+  const Property& parent = setting.parent.empty() ? root : root[setting.parent];
+  const bool writable = parent.GetType() == kContainer;
+  std::uint64_t expected = Digest(parent, parent.GetName(), &setting.key, Digest(stored));
+  if (&parent != &root) expected = Digest(root, root.GetName(), &setting.parent, expected);
+  if (!writable) expected = Digest(root);
+  Require(Threw<Core::MethodIsNotApplicable>([&] { entry.accessor->set(slot, value); }) != writable,
+          "a Set into a leaf was taken, or a Set refused");
+  Require(Digest(root) == expected, "a Set changed other than its own setting");
+  Require(!writable ||
+              (entry.accessor->exists(slot) && entry.accessor->get(slot, setting.key) == stored),
+          "a Set did not read back");
 }
 
-void OpCreate(State& state, Program& program) {
-  CodecPtr& slot = PickCodec(state, program);
-  const Kind kind = static_cast<Kind>(program.Below(4));
-  slot = Create(kind);
-  Require(slot->GetRefCount() == 1, "Create did not return the only reference");
-  Require(slot->GetCodecName() == "Unknown codec", "a new description has another codec name");
-  Require(slot->ExistsOptionsEncode() && slot->ExistsOptionsAnalyze(),
-          "a new description lacks its options");
-  Require(slot->GetInternalProperties().get<std::string>(Conf::TAG_OBJECT) == ObjectName(kind),
-          "a new description lacks its object name entry");
+// Reads of one setting, missing ones included, or of all present ones and the derived values.
+void OpRead(State& state, Program& program) {
+  const Slot& slot = Pick(state, program);
+  const auto& entries = EntriesOf(slot.kind);
+  const std::size_t selector = program.Byte();
+  if (selector < 0x20) return CheckRead(slot, entries[selector % entries.size()], true);
+  for (const Entry& entry : entries) CheckRead(slot, entry, false);
+  if (slot.kind == Kind::Video) CheckDerived(slot);
+  const Codec& codec = *slot.codec;
+  const Property* encode = Find(codec.GetProperty(), Codec::TAG_CODEC_OPTIONS_ENCODE);
+  const Property* analyze = Find(codec.GetProperty(), Codec::TAG_CODEC_OPTIONS_ANALYZE);
+  Require(codec.ExistsOptionsEncode() == (encode != nullptr) &&
+              codec.ExistsOptionsAnalyze() == (analyze != nullptr) &&
+              (!encode || &codec.GetOptionsEncode() == encode) &&
+              (!analyze || &codec.GetOptionsAnalyze() == analyze),
+          "the options disagree with the tree");
 }
 
-void OpClone(State& state, Program& program) {
-  CodecPtr& target = PickCodec(state, program);
-  const CodecPtr source = PickCodec(state, program);
-  CodecPtr clone;
-  switch (KindOf(*source)) {
-    case kVideo:
-      clone = As<Conf::IFormatCodecVideo>(*source).Clone();
-      break;
-    case kAudio:
-      clone = As<Conf::IFormatCodecAudio>(*source).Clone();
-      break;
-    case kSubtitle:
-      clone = As<Conf::IFormatCodecSubtitle>(*source).Clone();
-      break;
-    default:
-      return;  // the generic description has no Clone
-  }
-  Require(clone->GetRefCount() == 1, "Clone did not return the only reference");
-  Require(KindOf(*clone) == KindOf(*source), "a clone is of another kind");
-  Require(clone->Compare(source) && source->Compare(clone), "a clone differs from its source");
-  Require(clone->GetInternalProperties() == source->GetInternalProperties(),
-          "a clone has other runtime entries");
-  Require(!clone->GetPrivateData(), "a clone took the private data");
-  target = clone;
-}
-
-void OpShare(State& state, Program& program) {
-  CodecPtr& target = PickCodec(state, program);
-  target = PickCodec(state, program);
-}
-
-void OpSetInteger(State& state, Program& program) {
-  Codec& codec = *PickCodec(state, program);
-  const auto& settings = IntegerSettings();
-  const IntegerSetting& setting = settings[program.Below(settings.size())];
-  if (!Applies(setting, KindOf(codec))) return;
-  const long long value = program.Integer();
-  const long long stored = Narrow(setting.storage, value);
-  CheckedSet(codec, false, Property(*setting.key, stored), [&] { setting.set(codec, value); });
-  Require(setting.exists(codec), "Exists is false after a Set");
-  Require(setting.get(codec) == stored, "an integer did not read back");
-}
-
-void OpSetText(State& state, Program& program) {
-  Codec& codec = *PickCodec(state, program);
-  const auto& settings = TextSettings();
-  const TextSetting& setting = settings[program.Below(settings.size())];
-  if (!Applies(setting, KindOf(codec))) return;
-  const std::string value = program.Text();
-  if (!CheckedSet(codec, setting.inMetadata, Property(*setting.key, value),
-                  [&] { setting.set(codec, value); })) {
-    return;
-  }
-  Require(setting.exists(codec), "Exists is false after a Set");
-  Require(setting.get(codec) == value, "a text did not read back");
-}
-
-void OpSetFlag(State& state, Program& program) {
-  Codec& codec = *PickCodec(state, program);
-  const auto& settings = FlagSettings();
-  const FlagSetting& setting = settings[program.Below(settings.size())];
-  const bool value = program.Flag();
-  CheckedSet(codec, false, Property(*setting.key, value), [&] { setting.set(codec, value); });
-  Require(setting.exists(codec), "Exists is false after a Set");
-  Require(setting.get(codec) == value, "a flag did not read back");
+// A setting's child written through the tree with any type and value (integers beyond the
+// setting's width among them), then read through its accessors.
+void OpStore(State& state, Program& program) {
+  Slot& slot = Pick(state, program);
+  const Entry& entry = EntriesOf(slot.kind)[program.Below(EntriesOf(slot.kind).size())];
+  Property tree(slot.codec->GetProperty());
+  auto parent = entry.setting->parent.empty() ? &tree : &*tree.FindChild(entry.setting->parent);
+  if (parent->GetType() != kContainer) return;
+  Property& child = parent->SetChild(entry.setting->key);
+  const std::size_t type = program.Below(4);
+  const std::uint64_t wide = type == 1 ? 0x100000000ULL : 0;  // beyond 32 bits
+  if (type <= 1)
+    child = static_cast<long long>(static_cast<std::uint64_t>(program.Integer()) + wide);
+  if (type == 2) child = program.Flag();
+  if (type == 3) child = program.Text();
+  slot.codec->SetProperty(tree);
+  Require(slot.codec->GetProperty() == tree, "SetProperty stored another tree");
+  CheckRead(slot, entry, true);
 }
 
 // SetFrameRate, InitByPixelAspect and InitByFrameAspect: several settings at once.
 void OpVideoGeometry(State& state, Program& program) {
-  Codec& codec = *PickCodec(state, program);
-  if (KindOf(codec) != kVideo) return;
-  auto& video = As<Conf::IFormatCodecVideo>(codec);
-  using V = Conf::IFormatCodecVideo;
-  const auto a = static_cast<unsigned>(program.Integer());
-  const auto b = static_cast<unsigned>(program.Integer());
-  Property expected(codec.GetProperty());
-  const auto put = [&expected](const std::string& key, std::uint64_t value) {
-    SetOrAppend(expected, key, Property(key, static_cast<long long>(value)));
-  };
-  switch (program.Below(3)) {
-    case 0:
-      video.SetFrameRate(a, b);
-      put(V::TAG_TIMEBASE_N, a);
-      put(V::TAG_TIMEBASE_D, b);
-      break;
-    case 1: {
-      const auto x = static_cast<unsigned>(program.Integer());
-      const auto y = static_cast<unsigned>(program.Integer());
-      video.InitByPixelAspect(a, b, x, y);
-      put(V::TAG_WIDTH, a);
-      put(V::TAG_HEIGHT, b);
-      put(V::TAG_ASPECTX, x);
-      put(V::TAG_ASPECTY, y);
-      break;
-    }
-    default: {
-      const auto frameX = static_cast<unsigned>(program.Integer());
-      const auto frameY = static_cast<unsigned>(program.Integer());
-      video.InitByFrameAspect(a, b, frameX, frameY);
-      std::uint64_t x = 0;
-      std::uint64_t y = 0;
-      ReducedProducts(frameX, b, frameY, a, x, y);
-      put(V::TAG_WIDTH, a);
-      put(V::TAG_HEIGHT, b);
-      put(V::TAG_ASPECTX, x);
-      put(V::TAG_ASPECTY, y);
-      break;
-    }
-  }
-  Require(codec.GetProperty() == expected, "a geometry write stored other values");
+  Slot& slot = Pick(state, program);
+  if (slot.kind != Kind::Video) return;
+  unsigned value[4];
+  for (unsigned& v : value) v = static_cast<unsigned>(program.Integer());
+  const auto [a, b, x, y] = value;
+  Property expected(slot.codec->GetProperty());
+  const std::size_t which = program.Below(3);
+  if (which == 0) slot.video->SetFrameRate(a, b);
+  if (which == 1) slot.video->InitByPixelAspect(a, b, x, y);
+  if (which == 2) slot.video->InitByFrameAspect(a, b, x, y);
+  const auto [aspectX, aspectY] =
+      which == 2 ? Reduced(x, b, y, a) : std::pair<std::uint64_t, std::uint64_t>(x, y);
+  expected.SetChildT<long long>(which == 0 ? Video::TAG_TIMEBASE_N : Video::TAG_WIDTH, a);
+  expected.SetChildT<long long>(which == 0 ? Video::TAG_TIMEBASE_D : Video::TAG_HEIGHT, b);
+  if (which != 0) expected.SetChildT(Video::TAG_ASPECTX, static_cast<long long>(aspectX));
+  if (which != 0) expected.SetChildT(Video::TAG_ASPECTY, static_cast<long long>(aspectY));
+  Require(slot.codec->GetProperty() == expected, "a geometry write stored other values");
+  CheckDerived(slot);
 }
 
-void OpSetProperty(State& state, Program& program) {
-  Codec& codec = *PickCodec(state, program);
-  Property built("");
-  const Property& source = PickTree(state, program, built);
-  if (Nodes(source) + 1 > kMaxNodes) return;
-  const Property before(codec.GetProperty());
-  // Expected: the tree's type, value and children under the object name, plus an empty metadata
-  // child when it has none.
-  Property expected(before.GetName());
-  expected = source;
-  const bool container = expected.GetType() == Tarvek::PropertyTypeContainer;
-  if (container && !expected.ChildExists(Conf::IFormat::TAG_METADATA)) {
-    expected.SetChild(Conf::IFormat::TAG_METADATA);
+// A tree to hand in: a description's tree or a sub-tree of one, or a new one.
+const Property& PickTree(State& state, Program& program, Property& built) {
+  const std::size_t which = program.Below(8);
+  if (which == 0) return Pick(state, program).codec->GetProperty();
+  if (which == 1) return Pick(state, program).codec->GetMetadata();
+  if (which == 2) {
+    const Property& root = Pick(state, program).codec->GetProperty();
+    const Property* child = Find(root, program.Text());
+    if (child != nullptr) return *child;
   }
-  try {
-    codec.SetProperty(source);
-  } catch (const Core::MethodIsNotApplicable&) {
-    Require(!container, "SetProperty refused a container");
-    Require(codec.GetProperty() == before, "a refused SetProperty changed the description");
-    return;
-  }
-  Require(container, "SetProperty took a leaf");
-  Require(codec.GetProperty() == expected, "SetProperty stored another tree");
+  std::size_t budget = kMaxNodes / 4;
+  return built = BuildTree(program, 0, budget);
 }
 
-void OpSetMetadata(State& state, Program& program) {
-  Codec& codec = *PickCodec(state, program);
+// SetProperty (a leaf is refused; a missing metadata child is added), SetMetadata, SetOptions.
+void OpSetTree(State& state, Program& program) {
+  Codec& codec = *Pick(state, program).codec;
+  const std::size_t which = program.Below(4);
   Property built("");
   const Property& source = PickTree(state, program, built);
-  if (Nodes(codec.GetProperty()) + Nodes(source) > kMaxNodes) return;
-  Property expected(codec.GetProperty());
-  *expected.FindChild(Conf::IFormat::TAG_METADATA) = source;
-  codec.SetMetadata(source);
-  Require(codec.GetProperty() == expected, "SetMetadata stored another tree");
+  const Property& root = codec.GetProperty();
+  if (Nodes(root) + Nodes(source) > kMaxNodes) return;
+  const std::string& key = which == 2   ? Codec::TAG_CODEC_OPTIONS_ENCODE
+                           : which == 3 ? Codec::TAG_CODEC_OPTIONS_ANALYZE
+                                        : Conf::IFormat::TAG_METADATA;
+  const bool refused = which == 0 && source.GetType() != kContainer;
+  const Property* metadata = Find(source, key);
+  const std::uint64_t kept = metadata != nullptr ? Digest(*metadata) : Digest(Property(key));
+  std::uint64_t expected = Digest(root, root.GetName(), &key, Digest(source, key));
+  if (which == 0) expected = refused ? Digest(root) : Digest(source, root.GetName(), &key, kept);
+  Require(Threw<Core::MethodIsNotApplicable>([&] {
+            if (which == 0) codec.SetProperty(source);
+            if (which == 1) codec.SetMetadata(source);
+            if (which == 2) codec.SetOptionsEncode(source);
+            if (which == 3) codec.SetOptionsAnalyze(source);
+          }) == refused,
+          "SetProperty took a leaf, or a tree was refused");
+  Require(Digest(root) == expected, "a tree was stored otherwise");
 }
 
-void OpSetOptions(State& state, Program& program) {
-  Codec& codec = *PickCodec(state, program);
-  const bool encode = program.Flag();
-  Property built("");
-  const Property& source = PickTree(state, program, built);
-  if (Nodes(codec.GetProperty()) + Nodes(source) > kMaxNodes) return;
-  const std::string& key =
-      encode ? Codec::TAG_CODEC_OPTIONS_ENCODE : Codec::TAG_CODEC_OPTIONS_ANALYZE;
-  Property expected(codec.GetProperty());
-  SetOrAppend(expected, key, source);
-  if (encode) {
-    codec.SetOptionsEncode(source);
-  } else {
-    codec.SetOptionsAnalyze(source);
-  }
-  Require(codec.GetProperty() == expected, "SetOptions stored another tree");
+void OpCreate(State& state, Program& program) {
+  Slot& slot = state.slots[program.Below(kSlots)];
+  Create(slot, kKinds[program.Below(4)]);
+}
+
+// A clone into a slot, or (of a generic description, which has no Clone) the same description.
+void OpClone(State& state, Program& program) {
+  Slot& target = Pick(state, program);
+  const Slot& source = Pick(state, program);
+  CodecPtr clone;
+  if (source.kind == Kind::Video) clone = source.video->Clone();
+  if (source.kind == Kind::Audio) clone = source.audio->Clone();
+  if (source.kind == Kind::Subtitle) clone = source.subtitle->Clone();
+  if (!clone) return void(target = Slot(source));
+  Require(clone->GetRefCount() == 1 && clone->Compare(source.codec) &&
+              source.codec->Compare(clone) && !clone->GetPrivateData() &&
+              clone->GetInternalProperties() == source.codec->GetInternalProperties(),
+          "a clone differs from its source or took its private data");
+  Assign(target, clone, Kind(source.kind));
 }
 
 void OpPrivateData(State& state, Program& program) {
-  CodecPtr& codec = PickCodec(state, program);
-  switch (program.Below(3)) {
-    case 0: {
-      const auto& blob = state.blobs[program.Below(kBlobSlots)];
-      codec->SetPrivateData(blob);
-      state.privateData[codec.get()] = blob.get();
-      break;
-    }
-    case 1:
-      codec->SetPrivateData(nullptr);
-      state.privateData[codec.get()] = nullptr;
-      break;
-    default:
-      // Handing back the blob already held keeps it held.
-      codec->SetPrivateData(codec->GetPrivateData());
-      break;
+  Slot& slot = Pick(state, program);
+  const std::size_t blob = program.Below(kBlobs + 1);
+  const CodecPtr codec = slot.codec;
+  const BlobPtr data = blob < kBlobs ? state.blobs[blob] : codec->GetPrivateData();
+  const bool counting = blob < kBlobs ? state.counting[blob] : slot.countingData;
+  codec->SetPrivateData(data);
+  for (Slot& other : state.slots) {
+    if (other.codec == codec) other.privateData = data.get(), other.countingData = counting;
   }
 }
 
 void OpBlob(State& state, Program& program) {
-  auto& slot = state.blobs[program.Below(kBlobSlots)];
-  switch (program.Below(5)) {
-    case 0: {
-      const std::string bytes = program.Text();
-      slot = Tarvek::CreateBlob(bytes.data(), bytes.size());
-      Require(slot->GetRefCount() == 1, "CreateBlob did not return the only reference");
-      Require(slot->GetSize() == bytes.size(), "a blob has another size");
-      Require(bytes.empty() ? slot->GetData() == nullptr
-                            : std::memcmp(slot->GetData(), bytes.data(), bytes.size()) == 0,
-              "a blob has other bytes");
-      break;
-    }
-    case 1: {
-      const auto size = static_cast<std::size_t>(program.Byte());
-      try {
-        slot = Tarvek::CreateBlob(nullptr, size);
-      } catch (const Core::CoreException&) {
-        Require(size != 0, "CreateBlob refused an empty blob");
-        break;
-      }
-      Require(size == 0 && slot->GetSize() == 0, "CreateBlob took null data");
-      break;
-    }
-    case 2:
-      slot = CountingBlob::Create();
-      break;
-    case 3:
-      slot = state.blobs[program.Below(kBlobSlots)];
-      break;
-    default:
-      slot.reset();
-      break;
-  }
+  const std::size_t index = program.Below(kBlobs);
+  const std::size_t which = program.Below(4);
+  const std::size_t other = program.Below(kBlobs);
+  state.counting[index] = which == 1 || (which == 2 && state.counting[other]);
+  BlobPtr& slot = state.blobs[index];
+  slot = which == 1 ? BlobPtr(CountingBlob::Create()) : which == 2 ? state.blobs[other] : BlobPtr();
+  if (which != 0) return;
+  const std::string bytes = program.Text();
+  const bool refused = bytes.empty() && program.Flag();  // null data of a size
+  Require(Threw<Core::CoreException>([&] {
+            slot =
+                Tarvek::CreateBlob(bytes.empty() ? nullptr : bytes.data(), bytes.size() + refused);
+          }) == refused,
+          "CreateBlob took null data of a size, or refused a blob");
+  Require(refused || (slot->GetRefCount() == 1 && slot->GetSize() == bytes.size() &&
+                      (bytes.empty() || !std::memcmp(slot->GetData(), bytes.data(), bytes.size()))),
+          "a blob is not what it was made of");
 }
 
 void OpCompare(State& state, Program& program) {
-  const CodecPtr& a = PickCodec(state, program);
-  const CodecPtr& b = PickCodec(state, program);
-  Require(a->Compare(b) == (a->GetProperty() == b->GetProperty()), "Compare disagrees with ==");
-  Require(a->Compare(a), "a description differs from itself");
-  Require(!a->Compare(nullptr), "a description equals null");
+  const CodecPtr a = Pick(state, program).codec;
+  const CodecPtr b = Pick(state, program).codec;
+  const bool same = a->Compare(b);
+  Require(same == b->Compare(a) && same == (a->GetProperty() == b->GetProperty()) &&
+              same == (Digest(a->GetProperty()) == Digest(b->GetProperty())) && a->Compare(a) &&
+              !a->Compare(nullptr),
+          "Compare is not symmetric, or disagrees with == or the digests");
 }
 
 // The compatibility tests read the settings of this description, then of the other, pair by
 // pair; the first failing read is reported, the first differing pair answers false.
 void OpIsCompatible(State& state, Program& program) {
-  const CodecPtr& a = PickCodec(state, program);
-  const CodecPtr other = program.Flag() ? PickCodec(state, program) : CodecPtr();
-  const Kind kind = KindOf(*a);
-  using V = Conf::IFormatCodecVideo;
-  using A = Conf::IFormatCodecAudio;
-  std::vector<std::pair<const std::string*, Storage>> pairs;
-  if (kind == kVideo) {
-    for (const std::string* key :
-         {&V::TAG_WIDTH, &V::TAG_HEIGHT, &V::TAG_ASPECTX, &V::TAG_ASPECTY}) {
-      pairs.emplace_back(key, StorageOf(kind, *key));
-    }
-  } else if (kind == kAudio) {
-    for (const std::string* key : {&A::TAG_SAMPLE_RATE, &A::TAG_LAYOUT, &A::TAG_SAMPLE_FORMAT}) {
-      pairs.emplace_back(key, StorageOf(kind, *key));
-    }
-  }
-  Outcome outcome = Outcome::kValue;
-  bool expected = true;
-  if (!pairs.empty() && (!other || KindOf(*other) != kind)) {
-    expected = false;
-    pairs.clear();
-  }
-  for (const auto& [key, storage] : pairs) {
-    const Property* mine = Find(a->GetProperty(), *key);
-    outcome = Expect(mine, Tarvek::PropertyTypeInt64);
-    if (outcome != Outcome::kValue) break;
-    const Property* theirs = Find(other->GetProperty(), *key);
-    outcome = Expect(theirs, Tarvek::PropertyTypeInt64);
-    if (outcome != Outcome::kValue) break;
-    if (Narrow(storage, mine->GetInt64()) != Narrow(storage, theirs->GetInt64())) {
-      expected = false;
-      break;
-    }
-  }
-  bool got = false;
-  if (ReadsAs(outcome, [&] { got = a->IsCompatible(other); })) {
-    Require(got == expected, "IsCompatible gave the wrong answer");
-  }
-}
-
-// The six bitrate functions: the wrong kind is refused, a missing or mistyped setting is
-// reported, the presets library may refuse the values; min <= default <= max when all answer.
-void OpBitrate(State& state, Program& program) {
-  const ConstCodecPtr codec = program.Below(8) == 0 ? ConstCodecPtr() : PickCodec(state, program);
-  const Kind kind = codec ? KindOf(*codec) : kGeneric;
-  using Function = boost::int64_t (*)(const ConstCodecPtr&);
-  const bool video = program.Flag();
-  static constexpr Function kVideoFunctions[3] = {
-      &Conf::GetMinVideoBitrate, &Conf::GetDefaultVideoBitrate, &Conf::GetMaxVideoBitrate};
-  static constexpr Function kAudioFunctions[3] = {
-      &Conf::GetMinAudioBitrate, &Conf::GetDefaultAudioBitrate, &Conf::GetMaxAudioBitrate};
-  const Function* functions = video ? kVideoFunctions : kAudioFunctions;
-  const int before = codec ? codec->GetRefCount() : 0;
-  const bool rightKind = kind == (video ? kVideo : kAudio);
-  boost::int64_t figures[3] = {};
-  int answered = 0;
-  int refusedByPresets = 0;
+  const Slot& a = Pick(state, program);
+  const Slot* b = program.Flag() ? &Pick(state, program) : nullptr;
+  static const std::vector<const std::string*> kKeys[] = {
+      {},
+      {&Video::TAG_WIDTH, &Video::TAG_HEIGHT, &Video::TAG_ASPECTX, &Video::TAG_ASPECTY},
+      {&Audio::TAG_SAMPLE_RATE, &Audio::TAG_LAYOUT, &Audio::TAG_SAMPLE_FORMAT},
+      {}};
+  const auto& keys = kKeys[static_cast<int>(a.kind)];
+  const bool sameKind = b != nullptr && b->kind == a.kind;
   int unreadable = 0;
+  bool expected = keys.empty() || sameKind;
+  for (std::size_t i = 0; sameKind && expected && unreadable == 0 && i < keys.size(); ++i) {
+    unreadable = Unreadable(a, {keys[i]});
+    if (unreadable == 0) unreadable = Unreadable(*b, {keys[i]});
+    expected = unreadable != 0 || Read(a, *keys[i]) == Read(*b, *keys[i]);
+  }
+  const CodecPtr other = b != nullptr ? b->codec : CodecPtr();
+  bool got = false;
+  const auto call = [&] { got = a.codec->IsCompatible(other); };
+  Require(Threw<Core::ChildNotFound>([&] {
+            Require(Threw<Core::WrongPropertyType>(call) == (unreadable == 2), "a mistyped read");
+          }) == (unreadable == 1),
+          "IsCompatible read a missing setting otherwise");
+  Require(
+      unreadable != 0 || (got == expected && (!sameKind || other->IsCompatible(a.codec) == got)),
+      "IsCompatible gave the wrong answer, or another one the other way");
+}
+
+// The three bitrate functions of the description's kind (or, now and then, of another kind or
+// for null, which are refused): they answer alike, and min <= default <= max. After a setting
+// that does not read, the other two are not asked (each throw records a call stack).
+void OpBitrate(State& state, Program& program) {
+  const std::uint8_t choice = program.Byte();
+  const Slot& slot = Pick(state, program);
+  const bool video = choice < 8 ? (choice & 1) != 0 : slot.kind == Kind::Video;
+  const bool rightKind = choice != 0 && slot.kind == (video ? Kind::Video : Kind::Audio);
+  if (!rightKind && choice >= 8) return;
+  using Function = boost::int64_t (*)(const boost::intrusive_ptr<const Codec>&);
+  static constexpr Function kFunctions[2][3] = {
+      {&Conf::GetMinAudioBitrate, &Conf::GetDefaultAudioBitrate, &Conf::GetMaxAudioBitrate},
+      {&Conf::GetMinVideoBitrate, &Conf::GetDefaultVideoBitrate, &Conf::GetMaxVideoBitrate}};
+  boost::int64_t figures[3] = {};
+  int outcome[3] = {};  // 0 answered, 1 refused by the presets, 2 a setting unreadable
   for (int i = 0; i < 3; ++i) {
+    if (outcome[0] == 2) outcome[i] = 2;
+    if (outcome[0] == 2) continue;
     try {
-      figures[i] = functions[i](codec);
-      ++answered;
+      figures[i] = kFunctions[video][i](choice == 0 ? CodecPtr() : slot.codec);
+      Require(rightKind, "a bitrate function took the wrong kind of description");
     } catch (const Conf::UnknownCodecError&) {
-      ++refusedByPresets;
+      outcome[i] = 1;
     } catch (const Conf::InvalidPresetArgumentError&) {
-      ++refusedByPresets;
+      outcome[i] = 1;
     } catch (const Conf::ConfException& e) {
-      Require(!rightKind, "a bitrate function refused the right kind of description");
-      const auto* description = boost::get_error_info<Tarvek::DescriptionInfo>(e);
-      Require(
-          description != nullptr && *description == "Incompatible type of IFormatCodec structure",
-          "a wrong kind was refused with another description");
-      continue;
+      const auto* text = boost::get_error_info<Tarvek::DescriptionInfo>(e);
+      Require(!rightKind && text && *text == "Incompatible type of IFormatCodec structure",
+              "the wrong kind was refused otherwise, or the right kind refused");
     } catch (const Core::ChildNotFound&) {
-      ++unreadable;
+      outcome[i] = 2;
     } catch (const Core::WrongPropertyType&) {
-      ++unreadable;
+      outcome[i] = 2;
     }
-    Require(rightKind, "a bitrate function accepted the wrong kind of description");
-    Require(!codec || codec->GetRefCount() == before, "a bitrate function kept a reference");
   }
-  Require(answered == 0 || answered == 3, "the three bitrate functions disagree");
-  Require(unreadable == 0 || unreadable == 3, "the three bitrate functions read differently");
-  Require(refusedByPresets == 0 || refusedByPresets == 3, "the presets refused only some");
-  if (answered == 3) {
-    Require(figures[0] <= figures[1] && figures[1] <= figures[2], "min <= default <= max broke");
-  }
+  Require(outcome[0] == outcome[1] && outcome[1] == outcome[2] &&
+              (outcome[0] != 0 || (figures[0] <= figures[1] && figures[1] <= figures[2])),
+          "the bitrates answer differently, or min <= default <= max broke");
 }
 
-// Restores std::cout's buffer however the call ends.
-class RedirectStdout {
- public:
-  explicit RedirectStdout(std::streambuf* buffer) : previous_(std::cout.rdbuf(buffer)) {}
-  ~RedirectStdout() { std::cout.rdbuf(previous_); }
-  RedirectStdout(const RedirectStdout&) = delete;
-  RedirectStdout& operator=(const RedirectStdout&) = delete;
-
- private:
-  std::streambuf* previous_;
-};
-
-// PrintContent into a buffer that is then dropped, and the tree printer, which must keep every
-// node on one line whatever its name and value hold.
-void OpPrint(State& state, Program& program) {
-  Codec& codec = *PickCodec(state, program);
-  if (program.Flag()) {
-    std::ostringstream discarded;
-    {
-      const RedirectStdout redirect(discarded.rdbuf());
-      codec.PrintContent();
-    }
-    const std::string text = discarded.str();
-    const std::size_t lines = Nodes(codec.GetProperty()) + 1;
-    std::size_t position = 0;
-    for (std::size_t i = 0; i < lines && position != std::string::npos; ++i) {
-      position = text.find('\n', position);
-      if (position != std::string::npos) ++position;
-    }
-    Require(text.rfind("======External props:=====\n", 0) == 0, "PrintContent lost its header");
-    Require(position != std::string::npos &&
-                text.compare(position, 28, "======Runtime props:=======\n") == 0,
-            "PrintContent did not print one line a node");
-    return;
-  }
+// The tree printer keeps every node on one line, whatever its name and value hold; runtime
+// entries, which dotted paths nest, change nothing in the tree.
+void OpPrintAndEntries(State& state, Program& program) {
+  Codec& codec = *Pick(state, program).codec;
   const int indent = static_cast<std::int8_t>(program.Byte());  // negative too
-  const bool showTypes = program.Flag();
   const bool recursive = program.Flag();
-  const Property& tree = program.Flag() ? codec.GetProperty() : state.scratch;
+  Property built("");
+  const Property& tree = program.Flag() ? codec.GetProperty() : PickTree(state, program, built);
   std::ostringstream out;
-  Core::PrintPropertyValue(tree, indent, out, showTypes, recursive);
+  Core::PrintPropertyValue(tree, indent, out, program.Flag(), recursive);
   const std::string text = out.str();
-  const auto newlines = static_cast<std::size_t>(std::count(text.begin(), text.end(), '\n'));
-  Require(newlines == (recursive ? Nodes(tree) : 1), "PrintPropertyValue broke a node's line");
-}
-
-// The runtime entries: dotted paths create nested entries, which Clone copies and Compare
-// ignores.
-void OpInternal(State& state, Program& program) {
-  Codec& codec = *PickCodec(state, program);
+  Require(static_cast<std::size_t>(std::count(text.begin(), text.end(), '\n')) ==
+              (recursive ? Nodes(tree) : 1),
+          "PrintPropertyValue broke a node's line");
   boost::property_tree::ptree& entries = codec.GetInternalProperties();
+  Require(&static_cast<const Codec&>(codec).GetInternalProperties() == &entries,
+          "the two GetInternalProperties differ");
   std::string path = program.Text();
-  // Boost.PropertyTree requires a last path segment that is not empty; inner ones may be.
-  if (path.empty() || path.back() == '.') path += 'x';
-  const Property before(codec.GetProperty());
-  switch (program.Below(4)) {
-    case 0: {
-      const std::string value = program.Text();
-      entries.put(path, value);
-      Require(entries.get<std::string>(path) == value, "a runtime entry did not read back");
-      break;
-    }
-    case 1:
-      entries.add(path, program.Text());
-      break;
-    case 2:
-      entries.erase(path);
-      break;
-    default: {
-      const auto& constEntries = static_cast<const Codec&>(codec).GetInternalProperties();
-      Require(&constEntries == &entries, "the two GetInternalProperties differ");
-      (void)constEntries.get_optional<std::string>(path);
-      break;
-    }
-  }
-  if (entries.size() > 64) entries.clear();  // bound the work of later steps
-  Require(codec.GetProperty() == before, "a runtime entry changed the property tree");
+  if (path.empty() || path.back() == '.') path += 'x';  // the last segment may not be empty
+  const std::uint64_t before = Digest(codec.GetProperty());
+  const std::string value = program.Text();
+  if (program.Flag()) entries.erase(path);
+  entries.put(path, value);
+  Require(entries.get<std::string>(path) == value, "a runtime entry did not read back");
+  if (entries.size() > 64) entries.clear();  // bounds the work of later steps
+  Require(Digest(codec.GetProperty()) == before, "a runtime entry changed the property tree");
 }
 
-// The typed child helpers on the scratch tree or one of its children: set-or-append and append,
-// and a refusal on a leaf that names the node, its type and the helper, and changes nothing.
-void OpChildHelpers(State& state, Program& program) {
-  if (program.Below(6) == 0 || Nodes(state.scratch) >= kMaxNodes) {
-    std::size_t budget = kMaxNodes / 4;
-    state.scratch = BuildTree(program, 0, budget);
-    return;
-  }
-  const std::string childName = program.Text();
-  const bool onChild = program.Flag() && state.scratch.ChildExists(childName);
-  Property& target = onChild ? *state.scratch.FindChild(childName) : state.scratch;
-  const std::string name = program.Text();
-  const bool create = program.Flag();
-  Property value(name);
-  switch (program.Below(3)) {
-    case 0:
-      value = program.Flag();
-      break;
-    case 1:
-      value = program.Integer();
-      break;
-    default:
-      value = program.Text();
-      break;
-  }
-  const Property before(state.scratch);
-  Property expected(before);
-  Property& expectedTarget = onChild ? *expected.FindChild(childName) : expected;
-  const bool container = target.GetType() == Tarvek::PropertyTypeContainer;
-  if (container) {
-    if (create) {
-      expectedTarget.CreateChildT<bool>(name, false) = value;
-    } else {
-      SetOrAppend(expectedTarget, name, value);
-    }
-  }
-  const std::string targetName = target.GetName();
-  const Tarvek::PropertyTypes targetType = target.GetType();
-  try {
-    switch (value.GetType()) {
-      case Tarvek::PropertyTypeBool:
-        if (create) {
-          target.CreateChildT<bool>(name, value.GetBool());
-        } else {
-          target.SetChildT<bool>(name, value.GetBool());
-        }
-        break;
-      case Tarvek::PropertyTypeInt64:
-        if (create) {
-          target.CreateChildT<long long>(name, value.GetInt64());
-        } else {
-          target.SetChildT<long long>(name, value.GetInt64());
-        }
-        break;
-      default:
-        if (create) {
-          target.CreateChildT<std::string>(name, value.GetString());
-        } else {
-          target.SetChildT<std::string>(name, value.GetString());
-        }
-        break;
-    }
-  } catch (const Core::MethodIsNotApplicable& e) {
-    using Info = Core::PropertyException;
-    Require(!container, "a typed child helper refused a container");
-    Require(state.scratch == before, "a refused typed child helper changed the tree");
-    const auto* node = boost::get_error_info<Info::PropertyNameInfo>(e);
-    const auto* method = boost::get_error_info<Info::MethodNameInfo>(e);
-    const auto* type = boost::get_error_info<Info::PropertyTypeInfo>(e);
-    Require(node != nullptr && *node == targetName, "the refusal names another node");
-    Require(method != nullptr && *method == (create ? "CreateChildT" : "SetChildT"),
-            "the refusal names another helper");
-    Require(type != nullptr && *type == targetType, "the refusal names another type");
-    Require(boost::get_error_info<Tarvek::CallStackInfo>(e) != nullptr,
-            "the refusal has no call stack");
-    return;
-  }
-  Require(container, "a typed child helper added a child to a leaf");
-  Require(state.scratch == expected, "a typed child helper changed more than one child");
-}
-
-using Operation = void (*)(State&, Program&);
-
-constexpr Operation kOperations[] = {
-    OpCreate,        OpClone,        OpShare,       OpSetInteger, OpSetText,     OpSetFlag,
-    OpVideoGeometry, OpSetProperty,  OpSetMetadata, OpSetOptions, OpPrivateData, OpBlob,
-    OpCompare,       OpIsCompatible, OpBitrate,     OpPrint,      OpInternal,    OpChildHelpers,
-};
-
-void Run(Program& program) {
-  State state;
-  static constexpr Kind kInitial[kCodecSlots] = {kGeneric,  kVideo, kAudio,
-                                                 kSubtitle, kVideo, kAudio};
-  for (std::size_t i = 0; i < kCodecSlots; ++i) state.codecs[i] = Create(kInitial[i]);
-  state.blobs[0] = Tarvek::CreateBlob("abc", 3);
-  state.blobs[1] = CountingBlob::Create();
-  CheckState(state);
-  constexpr std::size_t kOperationCount = sizeof kOperations / sizeof kOperations[0];
-  while (!program.Done()) {
-    const std::uint8_t code = program.Byte();
-    if (code >= 0xf0) {
-      // Reads of one description, checked against its tree.
-      const Codec& codec = *PickCodec(state, program);
-      CheckReads(codec, program.Byte());
-    } else {
-      kOperations[code % kOperationCount](state, program);
-    }
-    CheckState(state);
-  }
-}
+// clang-format off
+constexpr void (*kOperations[])(State&, Program&) = {OpSet, OpSet, OpRead, OpStore,
+    OpVideoGeometry, OpSetTree, OpCreate, OpClone, OpPrivateData, OpBlob, OpCompare,
+    OpIsCompatible, OpBitrate, OpPrintAndEntries};
+// clang-format on
 
 }  // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   Program program(data, size);
-  Run(program);
+  {
+    State state;
+    state.blobs[0] = Tarvek::CreateBlob("abc", 3);
+    while (!program.Done()) {
+      kOperations[program.Byte() % std::size(kOperations)](state, program);
+      CheckState(state);
+    }
+  }
   Require(CountingBlob::Live() == 0, "a blob outlived every reference");
   return 0;
 }
