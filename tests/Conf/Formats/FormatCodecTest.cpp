@@ -1,6 +1,7 @@
 // FormatCodec and what the video, audio and subtitle descriptions share with it: the defaults of
 // a new description, cloning, the option sub-trees, the private data and the printed content.
-// The setting accessors are tested in SettingsTest.cpp.
+// The setting accessors are checked by the description fuzz target, whose corpus holds a program
+// per kind that writes and reads every setting.
 #include <Tarvek/Formats.h>
 
 #include <functional>
