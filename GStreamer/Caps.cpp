@@ -429,8 +429,9 @@ void SetAudio(GstStructure* s, IFormatCodecAudio& audio) {
     const int channels = SpeakerCount(layout);
     if (channels == 0) Fail(IFormatCodecAudio::TAG_LAYOUT, "a layout without speakers");
     SetInt(s, Quarks().channels, channels);
-    // One channel is GStreamer's mono, which has no position.
-    if (channels > 1) {
+    // One channel at the front centre is GStreamer's mono, which has no position; a single
+    // channel anywhere else keeps its position, or it would read back as mono.
+    if (channels > 1 || layout != Conf::CH_LAYOUT_MONO) {
       GValue value = G_VALUE_INIT;
       g_value_init(&value, GST_TYPE_BITMASK);
       gst_value_set_bitmask(&value, mask);
