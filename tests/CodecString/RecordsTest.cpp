@@ -69,6 +69,22 @@ TEST(CodecStringTest, StringsOfKnownRecords) {
   EXPECT_EQ(CodecString::GetCodecString(vp9), "vp09.02.40.10");
 }
 
+// A byte stream starts with a three- or four-byte start code; a record never does.
+TEST(CodecStringTest, ByteStreamsAreToldFromRecords) {
+  const std::pair<Bytes, bool> rows[] = {
+      {{0, 0, 1}, true},        {{0, 0, 0, 1}, true},  {{0, 0, 1, 0x67}, true},
+      {{0, 0}, false},          {{0, 0, 0}, false},    {{0, 0, 2}, false},
+      {{0, 1, 0, 1}, false},    {{1, 0, 0, 1}, false}, {{0, 0, 0, 0}, false},
+      {{0, 0, 0, 0, 1}, false}, {{1, 1, 1}, false},    {kAvcC, false},
+      {kHvcC, false},
+  };
+  for (const auto& [bytes, expected] : rows) {
+    EXPECT_EQ(CodecString::IsByteStream(bytes.data(), bytes.size()), expected)
+        << ::testing::PrintToString(bytes);
+  }
+  EXPECT_FALSE(CodecString::IsByteStream(nullptr, 4));
+}
+
 TEST(CodecStringTest, MissingPartsAreNamed) {
   EXPECT_EQ(Error([] { CodecString::GetCodecString(Video("h264", {})); }),
             "h264: the codec string needs the avcC record or a sequence parameter set (no "
