@@ -329,6 +329,11 @@ TEST(FFmpegStreamsTest, BadInputGivesNotesNotSettings) {
          s.codecpar->ch_layout.order = AV_CHANNEL_ORDER_UNSPEC;
        },
        "channel_layout"},
+      {true,  // two channels, three speakers in the mask
+       [](AVStream& s) {
+         s.codecpar->ch_layout = AVChannelLayout{AV_CHANNEL_ORDER_NATIVE, 2, {7}, nullptr};
+       },
+       "channel_layout"},
   };
   for (const auto& bad : cases) {
     std::unique_ptr<AVFormatContext, FormatFree> context(avformat_alloc_context());
@@ -344,6 +349,21 @@ TEST(FFmpegStreamsTest, BadInputGivesNotesNotSettings) {
     }
     Parameters back(avcodec_parameters_alloc());
     FFmpeg::ToCodecParameters(*described.description, *back);
+  }
+}
+
+// Values libavcodec names by its option constants are stored under those names.
+TEST(FFmpegStreamsTest, OptionConstantsGiveTheirNames) {
+  const std::pair<AVFieldOrder, const char*> rows[] = {{AV_FIELD_PROGRESSIVE, "progressive"},
+                                                       {AV_FIELD_TT, "tt"},
+                                                       {AV_FIELD_BB, "bb"},
+                                                       {AV_FIELD_TB, "tb"},
+                                                       {AV_FIELD_BT, "bt"}};
+  for (const auto& [order, name] : rows) {
+    std::unique_ptr<AVFormatContext, FormatFree> context(avformat_alloc_context());
+    NewStream(*context, false).codecpar->field_order = order;
+    const FFmpeg::StreamDescription described = FFmpeg::DescribeStream(*context, 0);
+    EXPECT_EQ(described.description->GetMetadata()["field_order"].GetString(), name);
   }
 }
 
