@@ -4,6 +4,7 @@
 #include <boost/property_tree/ptree.hpp>
 #include <cstdint>
 #include <limits>
+#include <memory>
 #include <nlohmann/json.hpp>
 #include <unordered_set>
 #include <utility>
@@ -17,6 +18,7 @@
 #include "../Conf/Interfaces/IFormatCodecSubtitle.h"
 #include "../Conf/Interfaces/IFormatCodecVideo.h"
 #include "../Core/Errors/AddStack.h"
+#include "JsonDocument.h"
 #include "JsonLayout.h"
 #include "Settings.h"
 
@@ -29,9 +31,6 @@ using Json = nlohmann::ordered_json;
 using Entries = boost::property_tree::ptree;
 
 constexpr const char* kFormatName = "tarvek-description";
-// A node at level L of the tree (or of the runtime entries) sits 2L deep in the document, its
-// "children" array one deeper; nothing deeper than that is needed.
-constexpr int kMaxNesting = 2 * kJsonFormMaxDepth + 1;
 
 // ----- Errors -------------------------------------------------------------------------------
 
@@ -161,46 +160,11 @@ std::string DecodeBase64(const std::string& text, const std::string& pointer) {
   return bytes;
 }
 
-// Well-formed UTF-8 (Unicode table 3-7): what a JSON string may hold, and what the JSON library
-// accepts when it writes one.
-bool IsUtf8(const std::string& text) {
-  const auto* s = reinterpret_cast<const unsigned char*>(text.data());
-  const std::size_t n = text.size();
-  for (std::size_t i = 0; i < n;) {
-    const unsigned char c = s[i];
-    std::size_t length = 0;
-    unsigned char low = 0x80;
-    unsigned char high = 0xbf;
-    if (c < 0x80) {
-      ++i;
-      continue;
-    } else if (c >= 0xc2 && c <= 0xdf) {
-      length = 2;
-    } else if (c >= 0xe0 && c <= 0xef) {
-      length = 3;
-      if (c == 0xe0) low = 0xa0;
-      if (c == 0xed) high = 0x9f;
-    } else if (c >= 0xf0 && c <= 0xf4) {
-      length = 4;
-      if (c == 0xf0) low = 0x90;
-      if (c == 0xf4) high = 0x8f;
-    } else {
-      return false;
-    }
-    if (i + length > n || s[i + 1] < low || s[i + 1] > high) return false;
-    for (std::size_t k = 2; k < length; ++k) {
-      if (s[i + k] < 0x80 || s[i + k] > 0xbf) return false;
-    }
-    i += length;
-  }
-  return true;
-}
-
 // ----- Writing ------------------------------------------------------------------------------
 
 // Member `member` holding `text`, or `member`_base64 holding its bytes when it is not UTF-8.
 void PutText(Json& object, const std::string& member, const std::string& text) {
-  if (IsUtf8(text)) {
+  if (JsonLayout::IsUtf8(text)) {
     object[member] = text;
   } else {
     object[member + "_base64"] = EncodeBase64(text);
@@ -217,6 +181,7 @@ void CheckWriteDepth(int level, const char* what) {
 Json NodeJson(const Core::Property& node, int level, bool root) {
   CheckWriteDepth(level, "property tree");
   Json json = Json::object();
+  json.get_ptr<Json::object_t*>()->reserve(3);
   if (!root) PutText(json, "name", node.GetName());
   json["type"] = PropertyTypeName(node.GetType());
   switch (node.GetType()) {
@@ -265,8 +230,10 @@ const Json& Require(const Json& object, const std::string& pointer, const std::s
   return *found;
 }
 
-void RequireObject(const Json& value, const std::string& pointer, const std::string& what) {
-  if (!value.is_object()) Fail(pointer, "expected an object (" + what + "), found " + Found(value));
+void RequireObject(const Json& value, const std::string& pointer, const char* what) {
+  if (!value.is_object()) {
+    Fail(pointer, std::string("expected an object (") + what + "), found " + Found(value));
+  }
 }
 
 const Json& RequireArray(const Json& object, const std::string& pointer,
@@ -276,14 +243,30 @@ const Json& RequireArray(const Json& object, const std::string& pointer,
   return value;
 }
 
-void OnlyMembers(const Json& object, const std::string& pointer,
-                 const std::vector<std::string>& allowed) {
-  for (const auto& item : object.items()) {
+// The members an object of the form may have: at most five.
+struct Members {
+  const char* names[5];
+  std::size_t count = 0;
+  void Add(const char* name) { names[count++] = name; }
+};
+
+void OnlyMembers(const Json& object, const std::string& pointer, const Members& allowed) {
+  for (auto item = object.begin(); item != object.end(); ++item) {
     bool known = false;
-    for (const std::string& name : allowed) known = known || item.key() == name;
+    for (std::size_t i = 0; i < allowed.count && !known; ++i)
+      known = item.key() == allowed.names[i];
     if (!known) {
       Fail(pointer + "/" + Token(item.key()), "unknown member " + Quote(item.key()) + " here");
     }
+  }
+}
+
+// Refuses a node or entry deeper than the form holds; a parsed document may nest deeper than
+// the form's own text when it holds the description as a member.
+void CheckReadDepth(int level, const std::string& pointer, const char* what) {
+  if (level > kJsonFormMaxDepth) {
+    Fail(pointer, std::string("the ") + what + " is deeper than " +
+                      std::to_string(kJsonFormMaxDepth) + " levels, the most the JSON form holds");
   }
 }
 
@@ -302,15 +285,19 @@ std::string ReadText(const Json& object, const std::string& pointer, const std::
   return plain ? text : DecodeBase64(text, pointer + "/" + name);
 }
 
-long long ReadInt64(const Json& value, const std::string& pointer) {
+long long ReadInt64(const Json& object, const std::string& pointer) {
+  const Json& value = Require(object, pointer, "value");
   if (value.is_number_unsigned()) {
     const auto number = value.get<std::uint64_t>();
     if (number > static_cast<std::uint64_t>(std::numeric_limits<long long>::max())) {
-      Fail(pointer, "expected an integer in the 64-bit signed range, found " + value.dump());
+      Fail(pointer + "/value",
+           "expected an integer in the 64-bit signed range, found " + value.dump());
     }
     return static_cast<long long>(number);
   }
-  if (!value.is_number_integer()) Fail(pointer, "expected an integer, found " + Found(value));
+  if (!value.is_number_integer()) {
+    Fail(pointer + "/value", "expected an integer, found " + Found(value));
+  }
   return value.get<long long>();
 }
 
@@ -321,8 +308,11 @@ void Append(Core::Property& parent, Core::Property&& child) {
   slot = std::move(child);
 }
 
-// Recursive, to a depth that CheckNesting bounded before the text was parsed.
-Core::Property ReadNode(const Json& json, const std::string& pointer, const std::string* rootName) {
+// `pointer` is where the node is; the readers extend it for each child and restore it, so that
+// no path is spelt out per node. Recursive, to the depth CheckReadDepth allows.
+Core::Property ReadNode(const Json& json, std::string& pointer, const std::string* rootName,
+                        int level) {
+  CheckReadDepth(level, pointer, "property tree");
   RequireObject(json, pointer, "a node of the tree");
   const Json& typeJson = Require(json, pointer, "type");
   if (!typeJson.is_string()) {
@@ -333,13 +323,17 @@ Core::Property ReadNode(const Json& json, const std::string& pointer, const std:
   if (rootName != nullptr && !container) {
     Fail(pointer + "/type", "the root of the tree must be a container, found " + Quote(type));
   }
-  std::vector<std::string> allowed = {"type"};
-  if (rootName == nullptr) allowed.insert(allowed.end(), {"name", "name_base64"});
+  Members allowed;
+  allowed.Add("type");
+  if (rootName == nullptr) {
+    allowed.Add("name");
+    allowed.Add("name_base64");
+  }
   if (container) {
-    allowed.push_back("children");
+    allowed.Add("children");
   } else {
-    allowed.push_back("value");
-    if (type == "string") allowed.push_back("value_base64");
+    allowed.Add("value");
+    if (type == "string") allowed.Add("value_base64");
   }
   OnlyMembers(json, pointer, allowed);
   const std::string name = rootName != nullptr ? *rootName : ReadText(json, pointer, "name");
@@ -351,9 +345,7 @@ Core::Property ReadNode(const Json& json, const std::string& pointer, const std:
     }
     return Core::Property(name, value.get<bool>());
   }
-  if (type == "int64") {
-    return Core::Property(name, ReadInt64(Require(json, pointer, "value"), pointer + "/value"));
-  }
+  if (type == "int64") return Core::Property(name, ReadInt64(json, pointer));
   if (type == "string") return Core::Property(name, ReadText(json, pointer, "value"));
   if (!container) {
     Fail(pointer + "/type", "unknown type " + Quote(type) +
@@ -361,33 +353,48 @@ Core::Property ReadNode(const Json& json, const std::string& pointer, const std:
   }
   Core::Property node(name);
   const Json& children = RequireArray(json, pointer, "children");
+  const std::size_t length = pointer.size();
   for (std::size_t i = 0; i < children.size(); ++i) {
-    Append(node, ReadNode(children[i], pointer + "/children/" + std::to_string(i), nullptr));
+    pointer += "/children/";
+    pointer += std::to_string(i);
+    Append(node, ReadNode(children[i], pointer, nullptr, level + 1));
+    pointer.resize(length);
   }
   return node;
 }
 
-Entries ReadEntry(const Json& json, const std::string& pointer, std::string* key) {
+Entries ReadEntry(const Json& json, std::string& pointer, std::string* key, int level) {
+  CheckReadDepth(level, pointer, "runtime entries' tree");
   RequireObject(json, pointer, "a runtime entry");
-  std::vector<std::string> allowed = {"value", "value_base64", "children"};
-  if (key != nullptr) allowed.insert(allowed.end(), {"key", "key_base64"});
+  Members allowed;
+  allowed.Add("value");
+  allowed.Add("value_base64");
+  allowed.Add("children");
+  if (key != nullptr) {
+    allowed.Add("key");
+    allowed.Add("key_base64");
+  }
   OnlyMembers(json, pointer, allowed);
   if (key != nullptr) *key = ReadText(json, pointer, "key");
   Entries entry(ReadText(json, pointer, "value"));
   if (key != nullptr && !json.contains("children")) return entry;
   const Json& children = RequireArray(json, pointer, "children");
+  const std::size_t length = pointer.size();
   for (std::size_t i = 0; i < children.size(); ++i) {
+    pointer += "/children/";
+    pointer += std::to_string(i);
     std::string childKey;
-    Entries child = ReadEntry(children[i], pointer + "/children/" + std::to_string(i), &childKey);
+    Entries child = ReadEntry(children[i], pointer, &childKey, level + 1);
     entry.push_back(Entries::value_type(childKey, std::move(child)));
+    pointer.resize(length);
   }
   return entry;
 }
 
-// Refuses nesting beyond what a description needs before the JSON library builds anything, so
-// that a hostile text costs neither memory nor stack, and the readers below, which recurse, stay
-// within kJsonFormMaxDepth levels of tree. Brackets inside strings do not count.
-void CheckNesting(const std::string& text) {
+// Refuses nesting beyond `maxNesting` before anything is built, so that a hostile text costs
+// neither memory nor time; the readers above check the depth of what they read on their own.
+// Brackets inside strings do not count.
+void CheckNesting(const std::string& text, int maxNesting) {
   int depth = 0;
   bool inString = false;
   bool escaped = false;
@@ -410,8 +417,8 @@ void CheckNesting(const std::string& text) {
     } else if (c == '"') {
       inString = true;
     } else if (c == '[' || c == '{') {
-      if (++depth > kMaxNesting) {
-        FailPlain("JSON nested deeper than " + std::to_string(kMaxNesting) + " levels at line " +
+      if (++depth > maxNesting) {
+        FailPlain("JSON nested deeper than " + std::to_string(maxNesting) + " levels at line " +
                   std::to_string(line) + ", column " + std::to_string(column) +
                   "; a description's tree holds at most " + std::to_string(kJsonFormMaxDepth) +
                   " levels");
@@ -422,105 +429,127 @@ void CheckNesting(const std::string& text) {
   }
 }
 
-// A member's name as a JSON pointer component (RFC 6901).
-std::string PointerComponent(const std::string& name) {
-  std::string out;
-  for (const char c : name) {
-    if (c == '~') {
-      out += "~0";
-    } else if (c == '/') {
-      out += "~1";
-    } else {
-      out += c;
-    }
-  }
-  return out;
+// "[json.exception.parse_error.101] parse error at line 1, column 7: ..." as "malformed JSON at
+// line 1, column 7: ...".
+[[noreturn]] void FailMalformed(const std::string& what) {
+  const std::size_t at = what.find("parse error ");
+  FailPlain("malformed JSON " + (at == std::string::npos ? what : what.substr(at + 12)));
 }
 
-// Reads the text as a stream of events, holding no values, to refuse an object that names a
-// member twice (JSON takes the last one silently, so an edit of the first would be lost), naming
-// the member's JSON pointer. A reader of its own rather than a parse callback: the callback parser
-// searches the enclosing container at every object's end, which makes a long array of objects
-// (a container of many children) take quadratic time.
-class DuplicateMembers : public nlohmann::json_sax<Json> {
+// Builds the document from the parser's events, refusing an object that names a member twice
+// (JSON takes the last one silently, so an edit of the first would be lost) with the member's
+// JSON pointer. An object's members are gathered aside and moved into it whole when it ends:
+// the JSON library's own builder finds each key by a scan of its object, and its object's
+// storage copies every member, subtrees included, each time it grows, which makes a large object
+// or a member after a large one cost quadratic time.
+class Builder : public nlohmann::json_sax<Json> {
  public:
-  bool null() override { return Value(); }
-  bool boolean(bool /*value*/) override { return Value(); }
-  bool number_integer(number_integer_t /*value*/) override { return Value(); }
-  bool number_unsigned(number_unsigned_t /*value*/) override { return Value(); }
-  bool number_float(number_float_t /*value*/, const string_t& /*text*/) override { return Value(); }
-  bool string(string_t& /*value*/) override { return Value(); }
-  bool binary(binary_t& /*value*/) override { return Value(); }
-  bool start_object(std::size_t /*elements*/) override { return Start(true); }
-  bool start_array(std::size_t /*elements*/) override { return Start(false); }
-  bool end_object() override { return End(); }
-  bool end_array() override { return End(); }
-  bool key(string_t& key) override {
+  bool null() override { return Put(nullptr); }
+  bool boolean(bool value) override { return Put(value); }
+  bool number_integer(number_integer_t value) override { return Put(value); }
+  bool number_unsigned(number_unsigned_t value) override { return Put(value); }
+  bool number_float(number_float_t value, const string_t& /*text*/) override { return Put(value); }
+  bool string(string_t& value) override { return Put(std::move(value)); }
+  bool binary(binary_t& value) override { return Put(Json::binary(std::move(value))); }
+  bool start_object(std::size_t /*elements*/) override {
+    frames_.push_back({Place(Json::object()), {}, nullptr});
+    return true;
+  }
+  bool start_array(std::size_t /*elements*/) override {
+    frames_.push_back({Place(Json::array()), {}, nullptr});
+    return true;
+  }
+  bool end_object() override {
     Frame& frame = frames_.back();
-    frame.key = key;
-    if (!frame.keys.insert(frame.key).second) {
-      Fail(Pointer() + "/" + PointerComponent(frame.key),
-           "the member " + Quote(frame.key) + " appears twice in one object");
+    auto& object = *frame.value->get_ptr<Json::object_t*>();
+    object.reserve(frame.members.size());
+    for (auto& [name, value] : frame.members) {
+      object.Container::emplace_back(std::move(name), std::move(value));
     }
-    return true;
-  }
-  // Malformed text stops the reading; the parse that follows reports it.
-  bool parse_error(std::size_t /*position*/, const std::string& /*token*/,
-                   const nlohmann::detail::exception& /*error*/) override {
-    return false;
-  }
-
- private:
-  struct Frame {
-    bool object;
-    std::string component;  // how the parent reaches it
-    std::unordered_set<std::string> keys;
-    std::string key;   // the member being read, in an object
-    std::size_t next;  // the index of the next element, in an array
-  };
-
-  bool Value() {
-    if (!frames_.empty() && !frames_.back().object) ++frames_.back().next;
-    return true;
-  }
-  bool Start(bool object) {
-    frames_.push_back({object, Component(), {}, {}, 0});
-    return true;
-  }
-  bool End() {
     frames_.pop_back();
     return true;
   }
-
-  // The component of a value that starts now, inside the innermost container.
-  std::string Component() {
-    if (frames_.empty()) return std::string();
-    Frame& parent = frames_.back();
-    return parent.object ? PointerComponent(parent.key) : std::to_string(parent.next++);
+  bool end_array() override {
+    frames_.pop_back();
+    return true;
+  }
+  bool key(string_t& key) override {
+    Frame& frame = frames_.back();
+    if (Repeated(frame, key)) {
+      Fail(Pointer() + "/" + Token(key),
+           "the member " + Quote(key) + " appears twice in one object");
+    }
+    frame.members.emplace_back(std::move(key), nullptr);
+    return true;
+  }
+  bool parse_error(std::size_t /*position*/, const std::string& /*token*/,
+                   const nlohmann::detail::exception& error) override {
+    error_ = error.what();
+    return false;
   }
 
+  const std::string& Error() const { return error_; }
+  Json Take() { return std::move(root_); }
+
+ private:
+  // Up to this many members, an object is searched for a repeated name; past it, the names go
+  // into a set.
+  static constexpr std::size_t kScanned = 16;
+
+  struct Frame {
+    Json* value;                                        // the object or array being filled
+    std::vector<std::pair<std::string, Json>> members;  // an object's, until it ends
+    std::unique_ptr<std::unordered_set<std::string>> names;
+  };
+
+  Json* Place(Json&& value) {
+    if (frames_.empty()) {
+      root_ = std::move(value);
+      return &root_;
+    }
+    Frame& frame = frames_.back();
+    if (frame.value->is_array()) {
+      auto& elements = *frame.value->get_ptr<Json::array_t*>();
+      elements.push_back(std::move(value));
+      return &elements.back();
+    }
+    Json& member = frame.members.back().second;
+    member = std::move(value);
+    return &member;
+  }
+  bool Put(Json&& value) {
+    Place(std::move(value));
+    return true;
+  }
+
+  static bool Repeated(Frame& frame, const std::string& name) {
+    if (!frame.names) {
+      for (const auto& member : frame.members) {
+        if (member.first == name) return true;
+      }
+      if (frame.members.size() < kScanned) return false;
+      frame.names = std::make_unique<std::unordered_set<std::string>>();
+      for (const auto& member : frame.members) frame.names->insert(member.first);
+    }
+    return !frame.names->insert(name).second;
+  }
+
+  // The JSON pointer of the innermost container: how each container reaches its last child.
   std::string Pointer() const {
     std::string pointer;
-    for (std::size_t i = 1; i < frames_.size(); ++i) pointer += "/" + frames_[i].component;
+    for (std::size_t i = 0; i + 1 < frames_.size(); ++i) {
+      const Frame& frame = frames_[i];
+      pointer += "/";
+      pointer += frame.value->is_object() ? Token(frame.members.back().first)
+                                          : std::to_string(frame.value->size() - 1);
+    }
     return pointer;
   }
 
+  Json root_;
   std::vector<Frame> frames_;
+  std::string error_;
 };
-
-Json Parse(const std::string& text) {
-  CheckNesting(text);
-  try {
-    DuplicateMembers duplicates;
-    Json::sax_parse(text, &duplicates);
-    return Json::parse(text);
-  } catch (const Json::exception& e) {
-    // "[json.exception.parse_error.101] parse error at line 1, column 7: ..." without its tag.
-    const std::string what = e.what();
-    const std::size_t at = what.find("parse error ");
-    FailPlain("malformed JSON " + (at == std::string::npos ? what : what.substr(at + 12)));
-  }
-}
 
 boost::intrusive_ptr<IFormatCodec> CreateOfKind(const Json& document) {
   const Json& kind = Require(document, "", "kind");
@@ -548,11 +577,26 @@ const char* DescriptionKind(const boost::intrusive_ptr<const IFormat>& descripti
   return kind ? KindName(*kind) : "";
 }
 
-std::string ToJson(const boost::intrusive_ptr<IFormatCodec>& description) {
+Json JsonDocument::Parse(const std::string& text, int maxNesting) {
+  CheckNesting(text, maxNesting);
+  Builder builder;
+  bool parsed = false;
+  try {
+    parsed = Json::sax_parse(text, &builder);
+  } catch (const Json::exception& e) {
+    FailMalformed(e.what());
+  }
+  if (!parsed) FailMalformed(builder.Error());
+  return builder.Take();
+}
+
+Json JsonDocument::Make(const boost::intrusive_ptr<IFormatCodec>& description) {
   if (!description) FailPlain("ToJson: there is no description (a null pointer)");
   const IFormatCodec& codec = *description;
   const Core::Property& tree = codec.GetProperty();
   Json document = Json::object();
+  // Room for every member first: the object's storage copies its members when it grows.
+  document.get_ptr<Json::object_t*>()->reserve(8);
   document["format"] = kFormatName;
   document["version"] = kJsonFormVersion;
   document["kind"] = DescriptionKind(description);
@@ -562,13 +606,10 @@ std::string ToJson(const boost::intrusive_ptr<IFormatCodec>& description) {
   const boost::intrusive_ptr<IBlob> data = description->GetPrivateData();
   document["private_data"] =
       data ? Json(EncodeBase64(data->GetData(), data->GetSize())) : Json(nullptr);
-  std::string text;
-  JsonLayout::Write(document, text);
-  return text;
+  return document;
 }
 
-boost::intrusive_ptr<IFormatCodec> FromJson(const std::string& text) {
-  const Json document = Parse(text);
+boost::intrusive_ptr<IFormatCodec> JsonDocument::Read(const Json& document) {
   RequireObject(document, "", "a description");
   const Json& format = Require(document, "", "format");
   if (!format.is_string() || format.get_ref<const std::string&>() != kFormatName) {
@@ -593,12 +634,14 @@ boost::intrusive_ptr<IFormatCodec> FromJson(const std::string& text) {
          "a " + std::string(DescriptionKind(description)) + " description is named " +
              Quote(expectedName) + ", found " + Quote(objectName));
   }
-  Core::Property tree = ReadNode(Require(document, "", "tree"), "/tree", &objectName);
+  std::string pointer = "/tree";
+  Core::Property tree = ReadNode(Require(document, "", "tree"), pointer, &objectName, 1);
   if (!tree.ChildExists(IFormat::TAG_METADATA)) {
     Fail("/tree/children",
          "no child named " + Quote(IFormat::TAG_METADATA) + ", which every description has");
   }
-  Entries entries = ReadEntry(Require(document, "", "internal"), "/internal", nullptr);
+  pointer = "/internal";
+  Entries entries = ReadEntry(Require(document, "", "internal"), pointer, nullptr, 1);
   const Json& dataJson = Require(document, "", "private_data");
   boost::intrusive_ptr<IBlob> data;
   if (dataJson.is_string()) {
@@ -611,6 +654,16 @@ boost::intrusive_ptr<IFormatCodec> FromJson(const std::string& text) {
   description->GetInternalProperties() = std::move(entries);
   description->SetPrivateData(data);
   return description;
+}
+
+std::string ToJson(const boost::intrusive_ptr<IFormatCodec>& description) {
+  std::string text;
+  JsonLayout::Write(JsonDocument::Make(description), text);
+  return text;
+}
+
+boost::intrusive_ptr<IFormatCodec> FromJson(const std::string& text) {
+  return JsonDocument::Read(JsonDocument::Parse(text, JsonDocument::kMaxNesting));
 }
 
 }  // namespace Conf

@@ -6,6 +6,7 @@
 #define TARVEK_INSPECT_JSONLAYOUT_H_
 
 #include <cstddef>
+#include <cstdint>
 #include <nlohmann/json.hpp>
 #include <string>
 
@@ -15,32 +16,137 @@ namespace JsonLayout {
 
 constexpr std::size_t kLineWidth = 100;
 
+// Well-formed UTF-8 (Unicode table 3-7): what a JSON string may hold.
+inline bool IsUtf8(const std::string& text) {
+  const auto* s = reinterpret_cast<const unsigned char*>(text.data());
+  const std::size_t n = text.size();
+  for (std::size_t i = 0; i < n;) {
+    const unsigned char c = s[i];
+    std::size_t length = 0;
+    unsigned char low = 0x80;
+    unsigned char high = 0xbf;
+    if (c < 0x80) {
+      ++i;
+      continue;
+    } else if (c >= 0xc2 && c <= 0xdf) {
+      length = 2;
+    } else if (c >= 0xe0 && c <= 0xef) {
+      length = 3;
+      if (c == 0xe0) low = 0xa0;
+      if (c == 0xed) high = 0x9f;
+    } else if (c >= 0xf0 && c <= 0xf4) {
+      length = 4;
+      if (c == 0xf0) low = 0x90;
+      if (c == 0xf4) high = 0x8f;
+    } else {
+      return false;
+    }
+    if (i + length > n || s[i + 1] < low || s[i + 1] > high) return false;
+    for (std::size_t k = 2; k < length; ++k) {
+      if (s[i + k] < 0x80 || s[i + k] > 0xbf) return false;
+    }
+    i += length;
+  }
+  return true;
+}
+
 // A value as JSON text; bytes that are not UTF-8 become U+FFFD instead of an exception.
 inline std::string Dump(const nlohmann::ordered_json& value) {
   return value.dump(-1, ' ', false, nlohmann::ordered_json::error_handler_t::replace);
 }
 
-// `value` on one line, with ", " and ": " between items.
-inline void WriteOneLine(const nlohmann::ordered_json& value, std::string& out) {
-  if (!value.is_structured() || value.empty()) {
-    out += Dump(value);
+// Appends `text` as a JSON string, escaped as the JSON library escapes it, without building a
+// JSON value for it: the writer's hot path.
+inline void WriteString(const std::string& text, std::string& out) {
+  if (!IsUtf8(text)) {
+    out += Dump(text);
     return;
   }
-  out += value.is_object() ? '{' : '[';
-  bool first = true;
-  for (const auto& item : value.items()) {
-    if (!first) out += ", ";
-    first = false;
-    if (value.is_object()) out += Dump(item.key()) + ": ";
-    WriteOneLine(item.value(), out);
+  constexpr char kHex[] = "0123456789abcdef";
+  out += '"';
+  for (const char c : text) {
+    const auto byte = static_cast<unsigned char>(c);
+    switch (c) {
+      case '"':
+        out += "\\\"";
+        break;
+      case '\\':
+        out += "\\\\";
+        break;
+      case '\b':
+        out += "\\b";
+        break;
+      case '\f':
+        out += "\\f";
+        break;
+      case '\n':
+        out += "\\n";
+        break;
+      case '\r':
+        out += "\\r";
+        break;
+      case '\t':
+        out += "\\t";
+        break;
+      default:
+        if (byte < 0x20) {
+          out += "\\u00";
+          out += kHex[byte >> 4];
+          out += kHex[byte & 0xf];
+        } else {
+          out += c;
+        }
+    }
   }
-  out += value.is_object() ? '}' : ']';
+  out += '"';
+}
+
+// Appends a value that is not a non-empty container.
+inline void WriteScalar(const nlohmann::ordered_json& value, std::string& out) {
+  switch (value.type()) {
+    case nlohmann::ordered_json::value_t::string:
+      WriteString(value.get_ref<const std::string&>(), out);
+      break;
+    case nlohmann::ordered_json::value_t::number_integer:
+      out += std::to_string(value.get<std::int64_t>());
+      break;
+    case nlohmann::ordered_json::value_t::number_unsigned:
+      out += std::to_string(value.get<std::uint64_t>());
+      break;
+    default:
+      out += Dump(value);
+  }
+}
+
+// Appends `value` on one line, with ", " and ": " between items; stops and returns false as soon
+// as `out` grows past `limit` characters.
+inline bool WriteOneLine(const nlohmann::ordered_json& value, std::string& out, std::size_t limit) {
+  if (!value.is_structured() || value.empty()) {
+    WriteScalar(value, out);
+    return out.size() <= limit;
+  }
+  const bool object = value.is_object();
+  out += object ? '{' : '[';
+  for (auto item = value.begin(); item != value.end(); ++item) {
+    if (item != value.begin()) out += ", ";
+    if (object) {
+      WriteString(item.key(), out);
+      out += ": ";
+    }
+    if (!WriteOneLine(*item, out, limit)) return false;
+  }
+  out += object ? '}' : ']';
+  return out.size() <= limit;
 }
 
 // Appends `value`, laid out, to `out`; `indent` is the indentation of its closing bracket and
 // `column` where it starts.
 inline void Write(const nlohmann::ordered_json& value, std::string& out, std::size_t indent = 0,
                   std::size_t column = 0) {
+  if (!value.is_structured() || value.empty()) {
+    WriteScalar(value, out);
+    return;
+  }
   bool plain = true;
   for (const auto& element : value) {
     if (element.is_structured() && !element.empty()) {
@@ -48,29 +154,26 @@ inline void Write(const nlohmann::ordered_json& value, std::string& out, std::si
       break;
     }
   }
-  if (!value.is_structured() || value.empty()) {
-    out += Dump(value);
+  const std::size_t start = out.size();
+  if (plain && column <= kLineWidth && WriteOneLine(value, out, start + kLineWidth - column)) {
     return;
   }
-  if (plain) {
-    std::string line;
-    WriteOneLine(value, line);
-    if (column + line.size() <= kLineWidth) {
-      out += line;
-      return;
+  out.resize(start);
+  const bool object = value.is_object();
+  out += object ? "{\n" : "[\n";
+  for (auto item = value.begin(); item != value.end(); ++item) {
+    if (item != value.begin()) out += ",\n";
+    out.append(indent + 2, ' ');
+    const std::size_t keyStart = out.size();
+    if (object) {
+      WriteString(item.key(), out);
+      out += ": ";
     }
+    Write(*item, out, indent + 2, indent + 2 + out.size() - keyStart);
   }
-  const std::string pad(indent + 2, ' ');
-  out += value.is_object() ? "{\n" : "[\n";
-  bool first = true;
-  for (const auto& item : value.items()) {
-    out += first ? pad : ",\n" + pad;
-    first = false;
-    const std::string key = value.is_object() ? Dump(item.key()) + ": " : std::string();
-    out += key;
-    Write(item.value(), out, indent + 2, pad.size() + key.size());
-  }
-  out += "\n" + std::string(indent, ' ') + (value.is_object() ? '}' : ']');
+  out += '\n';
+  out.append(indent, ' ');
+  out += object ? '}' : ']';
 }
 
 }  // namespace JsonLayout

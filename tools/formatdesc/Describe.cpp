@@ -1,10 +1,11 @@
-// formatdesc's descriptions, built only through the library's public interfaces.
+// formatdesc's descriptions: built from options, read from JSON documents.
 #include "Describe.h"
 
 #include "Output.h"
 
 #include <Tarvek/FFmpeg/Names.h>
 #include <Tarvek/FFmpeg/Streams.h>
+#include <Tarvek/Inspect/JsonDocument.h>
 
 #include <boost/exception/get_error_info.hpp>
 #if TARVEK_FORMATDESC_GSTREAMER
@@ -208,11 +209,13 @@ boost::intrusive_ptr<IFormatCodec> LoadDescription(const std::string& option,
                                                    const std::optional<std::string>& stream) {
   const std::string text = ReadFile(option, path);
   try {
-    Json document = Json::parse(text, nullptr, false);
-    const bool several = document.is_object() && document.contains("streams") &&
-                         document["streams"].is_array() && !document.contains("tree");
-    if (several) document = PickStream(document["streams"], stream, path);
-    const auto description = Tarvek::Conf::FromJson(several ? document.dump() : text);
+    // A probe's document holds each stream's description three levels down.
+    const Json whole =
+        Tarvek::Conf::JsonDocument::Parse(text, Tarvek::Conf::JsonDocument::kMaxNesting + 3);
+    const bool several = whole.is_object() && whole.contains("streams") &&
+                         whole["streams"].is_array() && !whole.contains("tree");
+    const Json& document = several ? PickStream(whole["streams"], stream, path) : whole;
+    const auto description = Tarvek::Conf::JsonDocument::Read(document);
     // The settings block is derived from the tree: an edit there must not pass unnoticed.
     if (document.is_object() && document.contains("settings")) {
       const std::string differs = FirstDifference(

@@ -11,6 +11,7 @@
 #include <string_view>
 #include <unordered_set>
 
+#include <Tarvek/Inspect/JsonDocument.h>
 #include <Tarvek/Inspect/JsonLayout.h>
 
 #include <Tarvek/CodecString/CodecString.h>
@@ -181,6 +182,7 @@ nlohmann::ordered_json TreeJson(const Tarvek::Core::Property& node) {
   std::unordered_set<std::string_view> seen;
   nlohmann::ordered_json object = nlohmann::ordered_json::object();
   auto& members = *object.get_ptr<nlohmann::ordered_json::object_t*>();
+  members.reserve(node.GetChildren().size());
   for (const Tarvek::Core::Property& child : node.GetChildren()) {
     if (seen.insert(child.GetName()).second) {
       members.Container::emplace_back(child.GetName(), TreeJson(child));
@@ -289,7 +291,9 @@ void PrintDescription(IFormatCodec& codec, const std::optional<Bitrates>& bitrat
 
 nlohmann::ordered_json DescriptionJson(const boost::intrusive_ptr<IFormatCodec>& codec,
                                        const std::optional<Bitrates>& bitrates) {
-  nlohmann::ordered_json json = nlohmann::ordered_json::parse(Tarvek::Conf::ToJson(codec));
+  nlohmann::ordered_json json = Tarvek::Conf::JsonDocument::Make(codec);
+  // Room for the members added below: the object's storage copies its members when it grows.
+  json.get_ptr<nlohmann::ordered_json::object_t*>()->reserve(json.size() + 12);
   json["settings"] = SettingsJson(codec->GetProperty());
   const Derived derived = Derive(*codec);
   if (derived.tag) json["codec_tag_name"] = *derived.tag;
