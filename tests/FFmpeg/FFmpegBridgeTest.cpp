@@ -40,15 +40,13 @@ struct ContextFree {
   void operator()(AVCodecContext* c) const { avcodec_free_context(&c); }
 };
 
-// One encoder's test: a description and what the opened encoder must report.
+// One encoder's test: a description (video when width is not 0; mode "cbr", "vbr" or "") and
+// what the opened encoder must report.
 struct EncoderCase {
   const char* codecId;
-  const char* mode;  // "cbr", "vbr" or ""
+  const char* mode;
   long long bitrateOrQuality;
-  int width;   // video when non-zero
-  int height;  //
-  int format;  // the pixel or the sample format
-  int sampleRate;
+  int width, height, format, sampleRate;
   ChannelLayout layout;
   int profile;
 };
@@ -354,16 +352,13 @@ TEST(FFmpegStreamsTest, BadInputGivesNotesNotSettings) {
 
 // Values libavcodec names by its option constants are stored under those names.
 TEST(FFmpegStreamsTest, OptionConstantsGiveTheirNames) {
-  const std::pair<AVFieldOrder, const char*> rows[] = {{AV_FIELD_PROGRESSIVE, "progressive"},
-                                                       {AV_FIELD_TT, "tt"},
-                                                       {AV_FIELD_BB, "bb"},
-                                                       {AV_FIELD_TB, "tb"},
-                                                       {AV_FIELD_BT, "bt"}};
-  for (const auto& [order, name] : rows) {
+  const char* const names[] = {"progressive", "tt", "bb", "tb", "bt"};
+  for (int order = AV_FIELD_PROGRESSIVE; order <= AV_FIELD_BT; ++order) {
     std::unique_ptr<AVFormatContext, FormatFree> context(avformat_alloc_context());
-    NewStream(*context, false).codecpar->field_order = order;
+    NewStream(*context, false).codecpar->field_order = static_cast<AVFieldOrder>(order);
     const FFmpeg::StreamDescription described = FFmpeg::DescribeStream(*context, 0);
-    EXPECT_EQ(described.description->GetMetadata()["field_order"].GetString(), name);
+    EXPECT_EQ(described.description->GetMetadata()["field_order"].GetString(),
+              names[order - AV_FIELD_PROGRESSIVE]);
   }
 }
 
