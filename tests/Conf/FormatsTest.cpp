@@ -1,7 +1,8 @@
-// The descriptions: the layout masks, the base's tree and runtime entries, what the codec
-// descriptions share (options, private data, printed content), the derived values of video and
-// the compatibility test of every kind. The description fuzz target checks the setting accessors
-// (where each write lands, the keys kept apart), Create's defaults, Clone and Compare.
+// The descriptions: the layout masks, reference counting, the printed content, the derived values
+// of video and the compatibility test of every kind. The description fuzz target checks the rest:
+// the setting accessors (where each write lands, the keys kept apart), Create's defaults, Clone,
+// Compare, SetProperty and the option setters (with trees of their own), and the private data's
+// references.
 #include <Tarvek/Formats.h>
 
 #include <cmath>
@@ -21,7 +22,6 @@ namespace {
 using namespace Tarvek::Conf;
 using Tarvek::Core::Property;
 using TarvekTest::CatchAs;
-using TarvekTest::CountingBlob;
 using TarvekTest::MissingKey;
 using Format = boost::intrusive_ptr<const IFormat>;
 
@@ -119,39 +119,6 @@ TEST(FormatBaseTest, NewBaseAndItsPrintedContent) {
             "alpha: two words\n");
 }
 
-// SetProperty keeps the root's name and the tree's own metadata, or adds an empty one; it copies
-// a reference into the description's own tree before replacing; a leaf, which cannot take the
-// metadata child, is refused and changes nothing.
-TEST(FormatBaseTest, SetPropertyKeepsTheNameAndTheMetadata) {
-  FormatBase base("desc");
-  Property tree("other");
-  tree.SetChildT<long long>("width", 720);
-  base.SetProperty(tree);
-  EXPECT_EQ(TarvekTest::ChildNames(base.GetProperty()), "width metadata ");
-  EXPECT_EQ(base.GetProperty().GetName(), "desc");
-  EXPECT_EQ(base.GetInternalProperties().size(), 1u);
-
-  Property metadata(IFormat::TAG_METADATA);
-  metadata.SetChildT<std::string>("title", "Intro");
-  tree.SetChild(IFormat::TAG_METADATA, metadata);
-  tree.SetChildT<long long>("height", 576);
-  base.SetProperty(tree);
-  EXPECT_EQ(TarvekTest::ChildNames(base.GetProperty()), "width metadata height ");
-  EXPECT_EQ(base.GetMetadata(), metadata);
-
-  base.SetProperty(base.GetProperty());
-  EXPECT_EQ(TarvekTest::ChildNames(base.GetProperty()), "width metadata height ");
-  base.SetProperty(base.GetMetadata());
-  Property own("desc");
-  own.SetChildT<std::string>("title", "Intro");
-  own.SetChild(IFormat::TAG_METADATA);
-  EXPECT_EQ(base.GetProperty(), own);
-
-  EXPECT_TRUE(
-      CatchAs<Tarvek::Core::MethodIsNotApplicable>([&] { base.SetProperty(Property("x", true)); }));
-  EXPECT_EQ(base.GetProperty(), own);
-}
-
 // The layout is read by people diagnosing streams and by tools that diff it: fixed to the byte,
 // the empty object name included.
 TEST(FormatCodecTest, PrintContentOfNewDescriptionIsExact) {
@@ -166,67 +133,6 @@ TEST(FormatCodecTest, PrintContentOfNewDescriptionIsExact) {
             "  codec_name (string): \"Unknown codec\"\n"
             "======Runtime props:=======\n"
             "object_name: \n");
-}
-
-// Set copies the content under the option key (whatever the given tree's name), replacing in
-// place; Get is a view into the tree. SetProperty does not restore the options; Set brings its
-// own back. The private data, outside the tree, is untouched throughout.
-TEST(FormatCodecTest, OptionsAreCopiedUnderTheirKey) {
-  using Setter = void (IFormatCodec::*)(const Property&);
-  using Getter = const Property& (IFormatCodec::*)() const;
-  const auto codec = FormatCodec::Create();
-  const auto blob = CountingBlob::Create();
-  codec->SetPrivateData(blob);
-  Property options("anything");
-  options.SetChildT<std::string>("preset", "slow");
-  const std::tuple<std::string, Setter, Getter> rows[] = {
-      {IFormatCodec::TAG_CODEC_OPTIONS_ENCODE, &IFormatCodec::SetOptionsEncode,
-       &IFormatCodec::GetOptionsEncode},
-      {IFormatCodec::TAG_CODEC_OPTIONS_ANALYZE, &IFormatCodec::SetOptionsAnalyze,
-       &IFormatCodec::GetOptionsAnalyze}};
-  for (const auto& [key, set, get] : rows) {
-    const Property& view = ((*codec).*get)();
-    EXPECT_EQ(&view, &codec->GetProperty()[key]);
-    for (const Property& given : {options, Property("other", true)}) {
-      Property expected(key);
-      expected = given;
-      ((*codec).*set)(given);
-      EXPECT_EQ(view, expected);
-    }
-  }
-  EXPECT_EQ(TarvekTest::ChildNames(codec->GetProperty()),
-            "metadata encode_options analyze_options codec_name ");
-
-  codec->SetProperty(Property("t"));
-  EXPECT_FALSE(codec->ExistsOptionsEncode());
-  EXPECT_FALSE(codec->ExistsOptionsAnalyze());
-  EXPECT_EQ(MissingKey([&] { codec->GetOptionsEncode(); }), IFormatCodec::TAG_CODEC_OPTIONS_ENCODE);
-  codec->SetOptionsEncode(Property("o"));
-  EXPECT_EQ(TarvekTest::ChildNames(codec->GetProperty()), "metadata encode_options ");
-  EXPECT_EQ(codec->GetPrivateData(), blob);
-}
-
-// The new blob is referenced before the old one is released, so handing in the held blob keeps
-// it; Get hands out the held blob itself; Compare ignores it; the last release frees it.
-TEST(FormatCodecTest, PrivateDataIsReferencedWhileHeld) {
-  const int live = CountingBlob::Live();
-  auto codec = FormatCodec::Create();
-  const auto first = CountingBlob::Create();
-  const auto second = CountingBlob::Create();
-  codec->SetPrivateData(first);
-  codec->SetPrivateData(first);
-  EXPECT_EQ(first->GetRefCount(), 2);
-  codec->SetPrivateData(second);
-  EXPECT_EQ(first->GetRefCount(), 1);
-  EXPECT_EQ(codec->GetPrivateData(), second);
-  EXPECT_EQ(second->GetRefCount(), 2);
-  EXPECT_TRUE(codec->Compare(FormatCodec::Create()));
-  codec->SetPrivateData(nullptr);
-  EXPECT_EQ(codec->GetPrivateData(), nullptr);
-  EXPECT_EQ(second->GetRefCount(), 1);
-  codec->SetPrivateData(CountingBlob::Create());
-  codec.reset();
-  EXPECT_EQ(CountingBlob::Live().load(), live + 2);
 }
 
 // Numerator over denominator, the denominator read first: when it is 0 the rate is 0 and the
