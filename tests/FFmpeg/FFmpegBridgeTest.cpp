@@ -40,15 +40,13 @@ struct ContextFree {
   void operator()(AVCodecContext* c) const { avcodec_free_context(&c); }
 };
 
-// One encoder's test: a description and what the opened encoder must report.
+// One encoder's test: a description (video when width is not 0; mode "cbr", "vbr" or "") and
+// what the opened encoder must report.
 struct EncoderCase {
   const char* codecId;
-  const char* mode;  // "cbr", "vbr" or ""
+  const char* mode;
   long long bitrateOrQuality;
-  int width;   // video when non-zero
-  int height;  //
-  int format;  // the pixel or the sample format
-  int sampleRate;
+  int width, height, format, sampleRate;
   ChannelLayout layout;
   int profile;
 };
@@ -154,13 +152,10 @@ TEST_P(EncoderTest, OpensWithTheSettingsAndRoundTrips) {
   EXPECT_EQ(context->thread_count, 1);
   EXPECT_NE(context->flags & AV_CODEC_FLAG_GLOBAL_HEADER, 0);
   const std::string mode = c.mode;
-  if (mode == "cbr") {
+  if (mode == "cbr") {  // video encoders also cap the rate
     EXPECT_EQ(context->bit_rate, c.bitrateOrQuality);
-  }
-  if (mode == "cbr" && c.width != 0) {
-    EXPECT_EQ(context->rc_max_rate, c.bitrateOrQuality);
-  }
-  if (mode == "vbr" && (context->flags & AV_CODEC_FLAG_QSCALE) != 0) {
+    EXPECT_EQ(c.width != 0 ? context->rc_max_rate : c.bitrateOrQuality, c.bitrateOrQuality);
+  } else if (mode == "vbr" && (context->flags & AV_CODEC_FLAG_QSCALE) != 0) {
     EXPECT_EQ(context->global_quality, c.bitrateOrQuality * FF_QP2LAMBDA);
   } else if (mode == "vbr" && c.width != 0) {
     double crf = -1;
@@ -181,9 +176,9 @@ TEST_P(EncoderTest, OpensWithTheSettingsAndRoundTrips) {
   if (c.width == 0) {
     EXPECT_EQ(parameters->ch_layout.u.mask, static_cast<uint64_t>(c.layout));
   }
-  const FFmpeg::StreamDescription described = FFmpeg::DescribeCodecParameters(*parameters);
   Parameters back(avcodec_parameters_alloc());
-  EXPECT_TRUE(FFmpeg::ToCodecParameters(*described.description, *back).empty());
+  const auto described = FFmpeg::DescribeCodecParameters(*parameters).description;
+  EXPECT_TRUE(FFmpeg::ToCodecParameters(*described, *back).empty());
   EXPECT_EQ(Fields(*back), Fields(*parameters));
 }
 
@@ -354,16 +349,13 @@ TEST(FFmpegStreamsTest, BadInputGivesNotesNotSettings) {
 
 // Values libavcodec names by its option constants are stored under those names.
 TEST(FFmpegStreamsTest, OptionConstantsGiveTheirNames) {
-  const std::pair<AVFieldOrder, const char*> rows[] = {{AV_FIELD_PROGRESSIVE, "progressive"},
-                                                       {AV_FIELD_TT, "tt"},
-                                                       {AV_FIELD_BB, "bb"},
-                                                       {AV_FIELD_TB, "tb"},
-                                                       {AV_FIELD_BT, "bt"}};
-  for (const auto& [order, name] : rows) {
+  const char* const names[] = {"progressive", "tt", "bb", "tb", "bt"};
+  for (int order = AV_FIELD_PROGRESSIVE; order <= AV_FIELD_BT; ++order) {
     std::unique_ptr<AVFormatContext, FormatFree> context(avformat_alloc_context());
-    NewStream(*context, false).codecpar->field_order = order;
+    NewStream(*context, false).codecpar->field_order = static_cast<AVFieldOrder>(order);
     const FFmpeg::StreamDescription described = FFmpeg::DescribeStream(*context, 0);
-    EXPECT_EQ(described.description->GetMetadata()["field_order"].GetString(), name);
+    EXPECT_EQ(described.description->GetMetadata()["field_order"].GetString(),
+              names[order - AV_FIELD_PROGRESSIVE]);
   }
 }
 

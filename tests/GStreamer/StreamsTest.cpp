@@ -7,11 +7,9 @@
 #include <gst/pbutils/pbutils.h>
 #include <gtest/gtest.h>
 
-#include <algorithm>
 #include <cctype>
 #include <filesystem>
 #include <fstream>
-#include <iostream>
 #include <iterator>
 #include <regex>
 #include <string>
@@ -47,8 +45,7 @@ boost::intrusive_ptr<Conf::IFormatCodec> Describe(const fs::path& folder) {
 
 // Codec strings compare without regard to case (RFC 6381 hexadecimal digits).
 std::string Lower(std::string text) {
-  std::transform(text.begin(), text.end(), text.begin(),
-                 [](unsigned char c) { return static_cast<char>(std::tolower(c)); });
+  for (char& c : text) c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
   return text;
 }
 
@@ -84,7 +81,6 @@ TEST(CodecStringStreamsTest, AgreeWithDashManifestAndGStreamer) {
     gchar* mime = gst_codec_utils_caps_get_mime_codec(caps);
     gst_caps_unref(caps);
     if (!mime) continue;  // a codec GStreamer has no string for
-    std::cout << codec << ": " << exact << " (DASH " << dash << ", GStreamer " << mime << ")\n";
     const std::string gst = Lower(mime);
     g_free(mime);
     if (gst.find('.') == std::string::npos)

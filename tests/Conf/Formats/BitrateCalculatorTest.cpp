@@ -1,10 +1,8 @@
 // The bitrate functions: the kind check and its error, what reaches the presets look-ups, and
-// that the description's reference count is the same after every call, however it ends. This
-// program defines the six look-ups itself, as a stand-in for the presets library that records
-// what it is handed, and links the bitrate functions against it.
+// the description's reference count after every call, however it ends. The six look-ups are
+// defined here, as a stand-in for the presets library that records what it is handed.
 #include <gtest/gtest.h>
 
-#include <cctype>
 #include <cstdint>
 #include <stdexcept>
 #include <string>
@@ -167,52 +165,33 @@ TEST_P(BitrateCalculatorTest, CallsItsOwnLookUpAndGivesTheReferenceBackHoweverIt
 INSTANTIATE_TEST_SUITE_P(AllSix, BitrateCalculatorTest, ::testing::ValuesIn(kFunctions),
                          [](const auto& info) { return std::string(info.param.name); });
 
-class VideoArgumentsTest : public ::testing::Test {
- protected:
-  const Call& Pass() {
-    last = Call{};
-    GetDefaultVideoBitrate(video_);
-    return last;
+// Width and height arrive zero-extended, the quality as its low 32 bits, a frame rate of
+// denominator 0 as 0, and the sample rate sign-extended. Only the exact, case-sensitive VBR mode
+// passes the quality on; in any other mode it is not even read, so it may be absent. The mode
+// itself must be there, even for the default.
+TEST(ArgumentsTest, ValuesArriveAsTheInterfaceDefines) {
+  const auto video = FullVideo();
+  video->SetQuality((1LL << 32) + 23);
+  video->InitByPixelAspect(4294967295u, 2147483648u, 1, 1);
+  video->SetFrameRate(25, 0);
+  EXPECT_EQ(GetDefaultVideoBitrate(video), 1001);
+  EXPECT_EQ(Fields(last),
+            Fields(Call{"GetDefaultVideoBitrate", "h264", 4294967295LL, 2147483648LL, 0.0, 23}));
+  for (const std::string mode : {"", "VBR", "vbr ", "cbr"}) {
+    video->SetBitrateMode(mode);
+    GetDefaultVideoBitrate(video);
+    EXPECT_EQ(last.quality, -1) << "mode \"" << mode << '"';
   }
-
-  boost::intrusive_ptr<IFormatCodecVideo> video_ = FullVideo();
-};
-
-// Width and height are zero-extended, the quality handed on as its low 32 bits, and a frame
-// rate of denominator 0 as 0.
-TEST_F(VideoArgumentsTest, OutOfRangeValuesArriveAsTheInterfaceDefines) {
-  video_->SetQuality((1LL << 32) + 23);
-  video_->InitByPixelAspect(4294967295u, 2147483648u, 1, 1);
-  video_->SetFrameRate(25, 0);
-  EXPECT_EQ(Pass().quality, 23);
-  EXPECT_EQ(last.width, 4294967295LL);
-  EXPECT_EQ(last.height, 2147483648LL);
-  EXPECT_EQ(last.frameRate, 0.0);
-}
-
-// Only the exact, case-sensitive VBR mode passes the quality on; in any other mode the quality
-// is not even read, so it may be absent. The mode itself must be there, even for the default.
-TEST_F(VideoArgumentsTest, QualityCountsOnlyInExactVbrMode) {
-  const std::string vbr = IFormatCodec::TAG_BITRATE_MODE_VBR;
-  std::string upper = vbr;
-  for (char& c : upper) c = static_cast<char>(std::toupper(static_cast<unsigned char>(c)));
-  ASSERT_NE(upper, vbr);
-  for (const std::string& mode : {std::string(), upper, vbr + " ", std::string("cbr")}) {
-    video_->SetBitrateMode(mode);
-    EXPECT_EQ(Pass().quality, -1) << "mode \"" << mode << '"';
-  }
-
-  video_->SetProperty(TarvekTest::Without(video_->GetProperty(), IFormatCodec::TAG_QUALITY));
-  EXPECT_EQ(Pass().quality, -1);
-  video_->SetProperty(TarvekTest::Without(video_->GetProperty(), IFormatCodec::TAG_BITRATE_MODE));
-  EXPECT_EQ(TarvekTest::MissingKey([&] { GetDefaultVideoBitrate(video_); }),
+  video->SetProperty(TarvekTest::Without(video->GetProperty(), IFormatCodec::TAG_QUALITY));
+  last.quality = 0;
+  GetDefaultVideoBitrate(video);
+  EXPECT_EQ(last.quality, -1);
+  video->SetProperty(TarvekTest::Without(video->GetProperty(), IFormatCodec::TAG_BITRATE_MODE));
+  EXPECT_EQ(TarvekTest::MissingKey([&] { GetDefaultVideoBitrate(video); }),
             IFormatCodec::TAG_BITRATE_MODE);
-}
 
-// The audio functions hand the sample rate on sign-extended (and, as FullAudio has neither,
-// read no bitrate mode or quality).
-TEST(AudioArgumentsTest, NegativeSampleRateArrivesNegative) {
-  auto audio = FullAudio();
+  // FullAudio has neither bitrate mode nor quality: the audio functions read none.
+  const auto audio = FullAudio();
   audio->SetSampleRate(-44100);
   EXPECT_EQ(GetMaxAudioBitrate(audio), 2003);
   EXPECT_EQ(last.sampleRate, -44100);
