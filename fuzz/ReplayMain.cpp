@@ -1,7 +1,5 @@
-// Runs a fuzz target's inputs once each, for builds without libFuzzer, so that its corpus is a
-// regression test under any compiler. Takes files and folders (every file in them, in name
-// order); arguments starting with '-' are libFuzzer's options and are ignored, so that one test
-// command serves both builds. A broken invariant aborts, which fails the test.
+// Runs a fuzz target's inputs once each without libFuzzer, so that its corpus is a regression test
+// under any compiler: files and folders (their files in name order); options ('-...') are ignored.
 #include <algorithm>
 #include <cstddef>
 #include <cstdint>
@@ -33,10 +31,7 @@ int main(int argc, char** argv) {
   std::sort(inputs.begin(), inputs.end());
   for (const auto& input : inputs) {
     std::ifstream file(input, std::ios::binary);
-    if (!file) {
-      std::cerr << "cannot read " << input << '\n';
-      return 1;
-    }
+    if (!file) return std::cerr << "cannot read " << input << '\n', 1;
     const std::vector<char> bytes{std::istreambuf_iterator<char>(file), {}};
     LLVMFuzzerTestOneInput(reinterpret_cast<const std::uint8_t*>(bytes.data()), bytes.size());
   }

@@ -81,7 +81,8 @@ TEST(ErrorsTest, RenderingAndCapture) {
   const auto refused = CatchAs<MethodIsNotApplicable>([] { std::rethrow_exception(Refusal()); });
   ASSERT_TRUE(refused);
   EXPECT_EQ(PropertyTypeLine(*refused), "[Tarvek::Core::PropertyException::TagPropertyType*] = 3");
-  const auto missing = CatchAs<Tarvek::Core::ChildNotFound>([] { (void)Property("root")["x"]; });
+  const Property root("root");
+  const auto missing = CatchAs<Tarvek::Core::ChildNotFound>([&] { (void)root["x"]; });
   ASSERT_TRUE(missing);
   EXPECT_EQ(PropertyTypeLine(*missing), "[Tarvek::Core::PropertyException::TagPropertyType*] = 6");
 

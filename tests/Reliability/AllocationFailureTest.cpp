@@ -300,13 +300,15 @@ TEST(AllocationFailureTest, PropertyEditsAreAllOrNothing) {
       +[](Property& p) { p.CreateChildT<std::string>("codec_id", std::string(100, 'z')); },
       +[](Property& p) { p.CreateChildT<long long>("width", 1); },
       +[](Property& p) { p.CreateChildT<bool>("flag", true); },
-      +[](Property& p) { Property copy(p); },
-      +[](Property& p) { p = Property("other", std::string(60, 'c')); },
   };
   for (auto helper : helpers) {
     ExpectAllOrNothing(tree, helper, same);
     ExpectAllOrNothing(leaf, helper, same);
   }
+  ExpectAllOrNothing(
+      tree, [](Property& p) { Property copy(p); }, same);
+  ExpectAllOrNothing(
+      tree, [](Property& p) { p = Property("other", std::string(60, 'c')); }, same);
   ExpectAllOrNothing(
       leaf, [&tree](Property& p) { p = tree(); }, same);
 }
