@@ -31,7 +31,10 @@ int main(int argc, char** argv) {
   std::sort(inputs.begin(), inputs.end());
   for (const auto& input : inputs) {
     std::ifstream file(input, std::ios::binary);
-    if (!file) return std::cerr << "cannot read " << input << '\n', 1;
+    if (!file) {
+      std::cerr << "cannot read " << input << '\n';
+      return 1;
+    }
     const std::vector<char> bytes{std::istreambuf_iterator<char>(file), {}};
     LLVMFuzzerTestOneInput(reinterpret_cast<const std::uint8_t*>(bytes.data()), bytes.size());
   }
