@@ -525,7 +525,7 @@ void OpStore(State& state, Program& program) {
   if (type == 3) child = program.Text();
   slot.codec->SetProperty(tree);
   Require(slot.codec->GetProperty() == tree, "SetProperty stored another tree");
-  CheckRead(slot, entry, (form & 0x30) == 0);
+  CheckRead(slot, entry, (form & 0x30) == 0x30);  // not for zeros, which inputs are full of
 }
 
 // SetFrameRate, InitByPixelAspect and InitByFrameAspect: several settings at once.
@@ -673,7 +673,7 @@ void OpIsCompatible(State& state, Program& program) {
     if (unreadable == 0) unreadable = Unreadable(*b, {keys[i]});
     expected = unreadable != 0 || Read(a, *keys[i]) == Read(*b, *keys[i]);
   }
-  if (unreadable != 0 && (form & 6) != 0) return;  // each throw records a call stack
+  if (unreadable != 0 && (form & 6) != 6) return;  // each throw records a call stack
   const CodecPtr other = b != nullptr ? b->codec : CodecPtr();
   bool got = false;
   const auto call = [&] { got = a.codec->IsCompatible(other); };
@@ -696,7 +696,7 @@ void OpBitrate(State& state, Program& program) {
   const bool rightKind = choice != 0 && slot.kind == (video ? Kind::Video : Kind::Audio);
   if (!rightKind && choice >= 8) return;
   // A missing codec identifier is the first read that fails: asked one time in four.
-  if (rightKind && !slot.codec->ExistsCodecID() && (choice & 0x60) != 0) return;
+  if (rightKind && !slot.codec->ExistsCodecID() && (choice & 0x60) != 0x60) return;
   using Function = boost::int64_t (*)(const boost::intrusive_ptr<const Codec>&);
   static constexpr Function kFunctions[2][3] = {
       {&Conf::GetMinAudioBitrate, &Conf::GetDefaultAudioBitrate, &Conf::GetMaxAudioBitrate},
