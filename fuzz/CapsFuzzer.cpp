@@ -1,6 +1,5 @@
-// libFuzzer target over caps text: any text given to FromCapsString is refused with a CapsError
-// or gives a description; a description's caps read back as the same codec, and its mapped
-// settings survive. Anything else (another exception, a sanitizer report) is a crash.
+// libFuzzer target over caps text: FromCapsString refuses a text with a CapsError or gives a
+// description whose caps read back as the same codec, width and channel layout.
 #include <Tarvek/Conf/Interfaces/IFormatCodecAudio.h>
 #include <Tarvek/Conf/Interfaces/IFormatCodecVideo.h>
 #include <Tarvek/GStreamer/Caps.h>

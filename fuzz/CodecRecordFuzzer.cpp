@@ -1,7 +1,5 @@
-// libFuzzer target over the codec configuration record readers and the codec strings made from
-// them. The first byte chooses the codec, the rest is the private data: every input gives a
-// codec string or a CodecStringError. Anything else (another exception, a sanitizer report, a
-// read outside the record) is a crash.
+// libFuzzer target over the codec configuration record readers: the first byte chooses the codec,
+// the rest is the private data; every input gives a codec string or a CodecStringError.
 #include <Tarvek/CodecString/CodecString.h>
 #include <Tarvek/Conf/Formats/FormatCodecAudio.h>
 #include <Tarvek/Conf/Formats/FormatCodecVideo.h>

@@ -1,29 +1,11 @@
 // A libFuzzer target that reads its input as a program of calls on four format descriptions and
-// three blobs, and checks invariants inside and after every step. Each step is a byte naming an
-// operation, then its arguments; reading past the end yields zeros. The settings are those of the
-// inspection library's table (Inspect/Settings.h): key, parent, type and width drive one Set, one
-// read and one tree-level write for every setting of every kind. A broken invariant, or an
-// exception the call does not document, aborts. Checked:
-//  - after every step: each root is a container named after its kind, with the metadata child
-//    GetMetadata returns; GetCodecType matches the kind; the private data is the blob last set;
-//    every reference count equals the references the program holds; no counting blob leaks;
-//  - Create: one reference, codec name "Unknown codec", both option containers, the object name
-//    entry, and Exists false for every other setting;
-//  - Set through each typed setter: the value as the table's width keeps it (low 32 bits, sign- or
-//    zero-extended, or all 64) lands under the key in its parent, in place of the first child of
-//    that name or appended last, and nothing else changes; Exists is then true and Get returns
-//    it; a Set into a metadata leaf is refused and changes nothing;
-//  - reads: Exists is true exactly when the key's child exists; Get returns a child of the
-//    table's type as the width keeps it (values beyond 32 bits as their low 32 bits), throws
-//    WrongPropertyType for another type and ChildNotFound naming the key for none (the audio
-//    language reads ""); the frame aspect and rate follow from the settings they derive from;
-//  - SetProperty (a leaf refused), SetMetadata, the options and the geometry setters store
-//    exactly what they are given;
-//  - Clone compares equal both ways, keeps the runtime entries, drops the private data; Compare
-//    is symmetric and agrees with == and with a digest of the trees computed here; IsCompatible
-//    answers from the geometry or audio format as the widths read them, both ways;
-//  - the bitrate functions refuse other kinds, answer alike, and min <= default <= max;
-//  - PrintPropertyValue prints one line a node; runtime entries leave the tree alone.
+// three blobs, and checks invariants in and after every step (a step is a byte naming an operation,
+// then its arguments; past the end every byte is zero). The settings are those of the inspection
+// library's table (Inspect/Settings.h): one Set, read and tree write for each. A broken invariant
+// (each Require names it), or an exception the call does not document, aborts. After every step:
+// each root is a container named after its kind with the metadata child GetMetadata returns,
+// GetCodecType matches the kind, the private data is the blob last set, every reference count
+// equals the references the program holds, and no counting blob leaks.
 #include <algorithm>
 #include <array>
 #include <cstdint>
@@ -238,8 +220,6 @@ const std::string& ObjectName(Kind kind) {
 // ---- The settings: the table's entries, each bound to its typed accessors ----
 
 struct Accessor {
-  Kind kind;  // Codec: every kind
-  const std::string* key;
   bool (*exists)(const Slot&);
   Property (*get)(const Slot&, const std::string& key);  // the value read, as a leaf
   void (*set)(Slot&, const Property& value);
@@ -275,46 +255,35 @@ struct Bind {
       (Of(slot).*Set)(static_cast<Arg>(value.GetInt64()));
     }
   }
-  static Accessor Make(const std::string& key) { return {K, &key, &Has, &Read, &Write}; }
+  static Accessor Make() { return {&Has, &Read, &Write}; }
 };
 
 using CodecClass = Codec;
 using VideoClass = Conf::FormatCodecVideo;
 using AudioClass = Audio;
 using SubtitleClass = Subtitle;
-#define TARVEK_ACCESSOR(K, key, Name) \
-  Bind<Kind::K, &K##Class::Exists##Name, &K##Class::Get##Name, &K##Class::Set##Name>::Make(key)
-const Accessor kAccessors[] = {
-    TARVEK_ACCESSOR(Codec, Codec::TAG_NAME, CodecName),
-    TARVEK_ACCESSOR(Codec, Codec::TAG_CODEC_ID, CodecID),
-    TARVEK_ACCESSOR(Codec, Codec::TAG_FOURCC, CodecTag),
-    TARVEK_ACCESSOR(Codec, Codec::TAG_BITRATE_MODE, BitrateMode),
-    TARVEK_ACCESSOR(Codec, Codec::TAG_BITRATE, Bitrate),
-    TARVEK_ACCESSOR(Codec, Codec::TAG_QUALITY, Quality),
-    TARVEK_ACCESSOR(Codec, Codec::TAG_LOSSLESS, Lossless),
-    TARVEK_ACCESSOR(Codec, Codec::TAG_THREAD_NUMBER, ThreadNumber),
-    TARVEK_ACCESSOR(Codec, Codec::TAG_TWO_PASS_ENCODING, TwoPassEncoding),
-    TARVEK_ACCESSOR(Codec, Codec::TAG_GLOBAL_HEADER, GlobalHeader),
-    TARVEK_ACCESSOR(Codec, Codec::TAG_MAIN_STREAM, MainStream),
-    TARVEK_ACCESSOR(Video, Video::TAG_WIDTH, Width),
-    TARVEK_ACCESSOR(Video, Video::TAG_HEIGHT, Height),
-    TARVEK_ACCESSOR(Video, Video::TAG_ASPECTX, PixelAspectX),
-    TARVEK_ACCESSOR(Video, Video::TAG_ASPECTY, PixelAspectY),
-    TARVEK_ACCESSOR(Video, Video::TAG_TIMEBASE_N, FrameRateNum),
-    TARVEK_ACCESSOR(Video, Video::TAG_TIMEBASE_D, FrameRateDen),
-    TARVEK_ACCESSOR(Video, Video::TAG_PIX_FMT, PixelFormat),
-    TARVEK_ACCESSOR(Audio, Codec::TAG_LANGUAGE, Language),
-    TARVEK_ACCESSOR(Audio, Audio::TAG_SAMPLE_RATE, SampleRate),
-    TARVEK_ACCESSOR(Audio, Audio::TAG_LAYOUT, ChannelLayout),
-    TARVEK_ACCESSOR(Audio, Audio::TAG_FRAME_SIZE, FrameSize),
-    TARVEK_ACCESSOR(Audio, Audio::TAG_SAMPLE_FORMAT, SampleFormat),
-    TARVEK_ACCESSOR(Subtitle, Codec::TAG_LANGUAGE, Language),
-    TARVEK_ACCESSOR(Subtitle, Conf::IFormatFile::TAG_TITLE, Title),
-    TARVEK_ACCESSOR(Subtitle, Subtitle::TAG_SUBTITLE_AUTHOR, Author),
-    TARVEK_ACCESSOR(Subtitle, Subtitle::TAG_SUBTITLE_HEADER, SubtitleHeader),
-    TARVEK_ACCESSOR(Subtitle, Subtitle::TAG_DVB_WIDTH, DVBWidth),
-    TARVEK_ACCESSOR(Subtitle, Subtitle::TAG_DVB_HEIGHT, DVBHeight),
-};
+#define TARVEK_ACCESSOR(K, Name) \
+  Bind<Kind::K, &K##Class::Exists##Name, &K##Class::Get##Name, &K##Class::Set##Name>::Make()
+// The accessors of the leaf settings in the table's order, the codec's first, then each kind's
+// own; keys, types and widths are the table's (one out of order fails its first Set).
+const std::vector<Accessor> kAccessors[] = {
+    {TARVEK_ACCESSOR(Codec, CodecName), TARVEK_ACCESSOR(Codec, CodecID),
+     TARVEK_ACCESSOR(Codec, CodecTag), TARVEK_ACCESSOR(Codec, BitrateMode),
+     TARVEK_ACCESSOR(Codec, Bitrate), TARVEK_ACCESSOR(Codec, Quality),
+     TARVEK_ACCESSOR(Codec, Lossless), TARVEK_ACCESSOR(Codec, ThreadNumber),
+     TARVEK_ACCESSOR(Codec, TwoPassEncoding), TARVEK_ACCESSOR(Codec, GlobalHeader),
+     TARVEK_ACCESSOR(Codec, MainStream)},
+    {TARVEK_ACCESSOR(Video, Width), TARVEK_ACCESSOR(Video, Height),
+     TARVEK_ACCESSOR(Video, PixelAspectX), TARVEK_ACCESSOR(Video, PixelAspectY),
+     TARVEK_ACCESSOR(Video, FrameRateNum), TARVEK_ACCESSOR(Video, FrameRateDen),
+     TARVEK_ACCESSOR(Video, PixelFormat)},
+    {TARVEK_ACCESSOR(Audio, Language), TARVEK_ACCESSOR(Audio, SampleRate),
+     TARVEK_ACCESSOR(Audio, ChannelLayout), TARVEK_ACCESSOR(Audio, FrameSize),
+     TARVEK_ACCESSOR(Audio, SampleFormat)},
+    {TARVEK_ACCESSOR(Subtitle, Language), TARVEK_ACCESSOR(Subtitle, Title),
+     TARVEK_ACCESSOR(Subtitle, Author), TARVEK_ACCESSOR(Subtitle, SubtitleHeader),
+     TARVEK_ACCESSOR(Subtitle, DVBWidth), TARVEK_ACCESSOR(Subtitle, DVBHeight)},
+    {}};  // a generic description has none of its own
 #undef TARVEK_ACCESSOR
 
 struct Entry {
@@ -322,19 +291,21 @@ struct Entry {
   const Accessor* accessor;
 };
 
-// The leaf settings of `kind` in the table's order; every one must have its accessors above.
+// The leaf settings of `kind` in the table's order, each with its accessors.
 const std::vector<Entry>& EntriesOf(Kind kind) {
   static const auto all = [] {
     std::array<std::vector<Entry>, 4> entries;
     for (const Kind of : kKinds) {
+      auto& list = entries[static_cast<std::size_t>(of)];
       for (const Conf::Setting& setting : Conf::SettingsOf(of)) {
-        const Accessor* found = nullptr;
-        for (const Accessor& a : kAccessors) {
-          if (*a.key == setting.key && (a.kind == Kind::Codec || a.kind == of)) found = &a;
-        }
-        Require(found != nullptr || setting.type == kContainer, "a setting has no accessor");
-        if (found != nullptr) entries[static_cast<std::size_t>(of)].push_back({&setting, found});
+        const std::size_t codec = kAccessors[0].size(), at = list.size();
+        const auto& own = kAccessors[of == Kind::Codec ? 4 : static_cast<std::size_t>(of)];
+        if (setting.type == kContainer) continue;
+        Require(at < codec || at - codec < own.size(), "a setting has no accessor");
+        list.push_back({&setting, at < codec ? &kAccessors[0][at] : &own[at - codec]});
       }
+      const std::size_t own = of == Kind::Codec ? 0 : kAccessors[static_cast<int>(of)].size();
+      Require(list.size() == kAccessors[0].size() + own, "an accessor has no setting");
     }
     return entries;
   }();
@@ -537,7 +508,7 @@ void OpRead(State& state, Program& program) {
 }
 
 // A setting's child written through the tree with any type and value (integers beyond the
-// setting's width among them), then read through its accessors.
+// setting's width among them), then read through its accessors (a failing read one time in four).
 void OpStore(State& state, Program& program) {
   Slot& slot = Pick(state, program);
   const Entry& entry = EntriesOf(slot.kind)[program.Below(EntriesOf(slot.kind).size())];
@@ -545,7 +516,8 @@ void OpStore(State& state, Program& program) {
   auto parent = entry.setting->parent.empty() ? &tree : &*tree.FindChild(entry.setting->parent);
   if (parent->GetType() != kContainer) return;
   Property& child = parent->SetChild(entry.setting->key);
-  const std::size_t type = program.Below(4);
+  const std::uint8_t form = program.Byte();  // the type, and whether a failing read is checked
+  const std::size_t type = form % 4;
   const std::uint64_t wide = type == 1 ? 0x100000000ULL : 0;  // beyond 32 bits
   if (type <= 1)
     child = static_cast<long long>(static_cast<std::uint64_t>(program.Integer()) + wide);
@@ -553,7 +525,7 @@ void OpStore(State& state, Program& program) {
   if (type == 3) child = program.Text();
   slot.codec->SetProperty(tree);
   Require(slot.codec->GetProperty() == tree, "SetProperty stored another tree");
-  CheckRead(slot, entry, true);
+  CheckRead(slot, entry, (form & 0x30) == 0x30);  // not for zeros, which inputs are full of
 }
 
 // SetFrameRate, InitByPixelAspect and InitByFrameAspect: several settings at once.
@@ -685,7 +657,8 @@ void OpCompare(State& state, Program& program) {
 // pair; the first failing read is reported, the first differing pair answers false.
 void OpIsCompatible(State& state, Program& program) {
   const Slot& a = Pick(state, program);
-  const Slot* b = program.Flag() ? &Pick(state, program) : nullptr;
+  const std::uint8_t form = program.Byte();  // whether there is another, and a failing call made
+  const Slot* b = (form & 1) != 0 ? &Pick(state, program) : nullptr;
   static const std::vector<const std::string*> kKeys[] = {
       {},
       {&Video::TAG_WIDTH, &Video::TAG_HEIGHT, &Video::TAG_ASPECTX, &Video::TAG_ASPECTY},
@@ -700,6 +673,7 @@ void OpIsCompatible(State& state, Program& program) {
     if (unreadable == 0) unreadable = Unreadable(*b, {keys[i]});
     expected = unreadable != 0 || Read(a, *keys[i]) == Read(*b, *keys[i]);
   }
+  if (unreadable != 0 && (form & 6) != 6) return;  // each throw records a call stack
   const CodecPtr other = b != nullptr ? b->codec : CodecPtr();
   bool got = false;
   const auto call = [&] { got = a.codec->IsCompatible(other); };
@@ -721,6 +695,8 @@ void OpBitrate(State& state, Program& program) {
   const bool video = choice < 8 ? (choice & 1) != 0 : slot.kind == Kind::Video;
   const bool rightKind = choice != 0 && slot.kind == (video ? Kind::Video : Kind::Audio);
   if (!rightKind && choice >= 8) return;
+  // A missing codec identifier is the first read that fails: asked one time in four.
+  if (rightKind && !slot.codec->ExistsCodecID() && (choice & 0x60) != 0x60) return;
   using Function = boost::int64_t (*)(const boost::intrusive_ptr<const Codec>&);
   static constexpr Function kFunctions[2][3] = {
       {&Conf::GetMinAudioBitrate, &Conf::GetDefaultAudioBitrate, &Conf::GetMaxAudioBitrate},

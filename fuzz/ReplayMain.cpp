@@ -1,7 +1,5 @@
-// Runs a fuzz target's inputs once each, for builds without libFuzzer, so that its corpus is a
-// regression test under any compiler. Takes files and folders (every file in them, in name
-// order); arguments starting with '-' are libFuzzer's options and are ignored, so that one test
-// command serves both builds. A broken invariant aborts, which fails the test.
+// Runs a fuzz target's inputs once each without libFuzzer, so that its corpus is a regression test
+// under any compiler: files and folders (their files in name order); options ('-...') are ignored.
 #include <algorithm>
 #include <cstddef>
 #include <cstdint>

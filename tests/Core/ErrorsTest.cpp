@@ -75,36 +75,30 @@ std::string PropertyTypeLine(const boost::exception& error) {
   return text.substr(start, text.find('\n', start) - start);
 }
 
-TEST(ErrorsTest, PropertyTypeRendersAsDecimalDigits) {
+// The property type renders as decimal digits; what() leaves out the description and the node's
+// name; boost::current_exception captures the error whole.
+TEST(ErrorsTest, RenderingAndCapture) {
   const auto refused = CatchAs<MethodIsNotApplicable>([] { std::rethrow_exception(Refusal()); });
   ASSERT_TRUE(refused);
   EXPECT_EQ(PropertyTypeLine(*refused), "[Tarvek::Core::PropertyException::TagPropertyType*] = 3");
-
   const Property root("root");
   const auto missing = CatchAs<Tarvek::Core::ChildNotFound>([&] { (void)root["x"]; });
   ASSERT_TRUE(missing);
   EXPECT_EQ(PropertyTypeLine(*missing), "[Tarvek::Core::PropertyException::TagPropertyType*] = 6");
-}
 
-TEST(ErrorsTest, WhatOmitsDescriptionAndName) {
-  const Property node("zebra_node", 1);
-  const auto wrong = CatchAs<Tarvek::Core::WrongPropertyType>([&] { (void)node.GetString(); });
+  const auto wrong =
+      CatchAs<Tarvek::Core::WrongPropertyType>([] { (void)Property("zebra_node", 1).GetString(); });
   ASSERT_TRUE(wrong);
-  const auto description = ItemOf<Tarvek::DescriptionInfo>(*wrong);
-  ASSERT_TRUE(description);
   const std::string what = wrong->what();
-  EXPECT_EQ(what.find(*description), std::string::npos) << what;
+  EXPECT_EQ(what.find(ItemOf<Tarvek::DescriptionInfo>(*wrong).value_or("?")), std::string::npos);
   EXPECT_EQ(what.find("zebra_node"), std::string::npos) << what;
-}
 
-TEST(ErrorsTest, CurrentExceptionCapturesThrownError) {
   boost::exception_ptr captured;
   try {
     Property("label", true).CreateChildT<bool>("child", false);
   } catch (...) {
     captured = boost::current_exception();
   }
-  ASSERT_TRUE(captured);
   const auto error = CatchAs<MethodIsNotApplicable>([&] { boost::rethrow_exception(captured); });
   ASSERT_TRUE(error);
   EXPECT_EQ(ItemOf<PropertyException::MethodNameInfo>(*error), "CreateChildT");

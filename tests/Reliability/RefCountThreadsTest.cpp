@@ -1,8 +1,6 @@
-// Reference counting shared between threads. Several threads copy and drop intrusive pointers to
-// descriptions and blobs that no thread writes, read them, clone them and compute their bitrates,
-// and the last references are dropped by whichever thread ends last. Meant for a ThreadSanitizer
-// build, where a data race fails the run; in every build the counts must end where they began and
-// every object must be freed exactly once.
+// Reference counting shared between threads: threads copy, read, clone and drop descriptions and
+// blobs that no thread writes; the last references go with whichever thread ends last. A data
+// race fails the ThreadSanitizer build; every build checks counts and frees.
 #include <gtest/gtest.h>
 
 #include <atomic>
@@ -72,16 +70,10 @@ Descriptions Make() {
   return made;
 }
 
-// What every thread must read, taken before the threads start.
-struct Expected {
-  long long videoBitrate;
-  long long audioBitrate;
-};
-
-// One thread's work on descriptions it only reads: `shared` is read by all threads at once, and
-// `handover` is this thread's own copy of pointers to objects whose last reference some thread
-// drops at its end. Returns the number of wrong results.
-int ReadConcurrently(const Descriptions& shared, Descriptions handover, const Expected& expected) {
+// One thread's work: `shared` is read by all threads at once; `handover` holds this thread's own
+// pointers to objects whose last reference some thread drops at its end. `bitrates` are the
+// default video and audio bitrates. Returns the number of wrong results.
+int ReadConcurrently(const Descriptions& shared, Descriptions handover, const long long* bitrates) {
   int wrong = 0;
   const auto check = [&wrong](bool ok) { wrong += ok ? 0 : 1; };
   try {
@@ -96,13 +88,12 @@ int ReadConcurrently(const Descriptions& shared, Descriptions handover, const Ex
       check(video->GetFrameRate() == 25.0 && video->GetCodecID() == "h264");
       check(audio->GetLanguage() == "eng" && audio->GetSampleRate() == 48000);
       check(subtitle->GetTitle() == "Commentary");
-      check(Conf::GetDefaultVideoBitrate(asCodec) == expected.videoBitrate);
-      check(Conf::GetDefaultAudioBitrate(audio) == expected.audioBitrate);
+      check(Conf::GetDefaultVideoBitrate(asCodec) == bitrates[0]);
+      check(Conf::GetDefaultAudioBitrate(audio) == bitrates[1]);
       check(video->IsCompatible(video) && !video->IsCompatible(audio) &&
             subtitle->IsCompatible(audio));
 
-      // A missing setting: the error, with its call stack, is built on this thread.
-      try {
+      try {  // a missing setting: the error, with its call stack, is built on this thread
         audio->GetFrameSize();
         check(false);
       } catch (const Core::ChildNotFound&) {
@@ -132,23 +123,21 @@ TEST(RefCountThreadsTest, SharedReadsCopiesAndClonesKeepCountsRight) {
   const int blobsBefore = TarvekTest::CountingBlob::Live();
   Descriptions shared = Make();
   Descriptions handover = Make();
-  const Expected expected{Conf::GetDefaultVideoBitrate(ConstCodecPtr(shared.video)),
-                          Conf::GetDefaultAudioBitrate(ConstCodecPtr(shared.audio))};
+  const long long bitrates[] = {Conf::GetDefaultVideoBitrate(ConstCodecPtr(shared.video)),
+                                Conf::GetDefaultAudioBitrate(ConstCodecPtr(shared.audio))};
 
   std::vector<std::thread> threads;
   std::vector<int> wrong(kThreads, 0);
   for (int i = 0; i < kThreads; ++i) {
-    threads.emplace_back([&shared, &expected, &wrong, i, copy = handover] {
-      wrong[static_cast<std::size_t>(i)] = ReadConcurrently(shared, copy, expected);
+    threads.emplace_back([&shared, &bitrates, &wrong, i, copy = handover] {
+      wrong[static_cast<std::size_t>(i)] = ReadConcurrently(shared, copy, bitrates);
     });
   }
   // From here on only the threads hold the handed-over objects: the last one to end frees them.
   handover = Descriptions();
   for (std::thread& thread : threads) thread.join();
 
-  for (int i = 0; i < kThreads; ++i) {
-    EXPECT_EQ(wrong[static_cast<std::size_t>(i)], 0) << "thread " << i;
-  }
+  EXPECT_EQ(wrong, std::vector<int>(kThreads, 0));
   EXPECT_EQ(CountedVideo::Destroyed(), videosBefore + 1);        // the handed-over video, once
   EXPECT_EQ(TarvekTest::CountingBlob::Live(), blobsBefore + 1);  // the shared blob only
   EXPECT_EQ(shared.video->GetRefCount(), 1);
