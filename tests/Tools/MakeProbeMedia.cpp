@@ -1,10 +1,7 @@
-// Writes the small media files the probe tests read into each folder named:
-//   MakeProbeMedia FOLDER...
-// or, with --streaming, one DASH presentation a codec the installed libavcodec can encode, each in
-// a folder of its own ("h264/stream.mpd"), for the codec string tests:
-//   MakeProbeMedia --streaming FOLDER
-// Synthetic pictures and tones go through libavcodec's single-threaded, bit-exact encoders and
-// libavformat's muxers, so the same libraries write the same bytes on every run.
+// Writes the small media files the probe tests read into each folder named (MakeProbeMedia
+// FOLDER...), or with --streaming FOLDER, for the codec string tests, one DASH presentation a
+// codec the installed libavcodec can encode ("h264/stream.mpd"). Synthetic pictures and tones go
+// through bit-exact encoders and libavformat's muxers: the same libraries write the same bytes.
 extern "C" {
 #include <libavcodec/avcodec.h>
 #include <libavformat/avformat.h>
@@ -18,10 +15,11 @@ extern "C" {
 #include <filesystem>
 #include <fstream>
 #include <iostream>
-#include <iterator>
 #include <memory>
 #include <stdexcept>
 #include <string>
+#include <tuple>
+#include <type_traits>
 #include <vector>
 
 namespace {
@@ -65,9 +63,7 @@ std::vector<std::pair<std::string, std::vector<Stream>>> Files() {
   const Stream low = video(352, 288, 30, {12, 11}, {30000, 1001}, Picture::Flat, 100000);
   const Stream surround = audio(AV_CODEC_ID_AC3, AV_CH_LAYOUT_5POINT1, 448000, "eng");
   const Stream stereo = audio(AV_CODEC_ID_AC3, AV_CH_LAYOUT_STEREO, 192000, "fre");
-  const auto pcm = [&](std::uint64_t layout) {
-    return audio(AV_CODEC_ID_PCM_S16LE, layout, 0, "");
-  };
+  const auto pcm = [&](std::uint64_t mask) { return audio(AV_CODEC_ID_PCM_S16LE, mask, 0, ""); };
   Stream subtitle = audio(AV_CODEC_ID_ASS, 0, 0, "ger"), font = subtitle, unseen = sd;
   subtitle.type = AVMEDIA_TYPE_SUBTITLE;
   font.type = AVMEDIA_TYPE_ATTACHMENT, font.codec = AV_CODEC_ID_TTF;
@@ -87,18 +83,17 @@ std::vector<std::pair<std::string, std::vector<Stream>>> Files() {
   };
 }
 
-void Check(int result, const std::string& what) {
-  if (result < 0) {
+// `result`, unless it is an error (a negative code or a null pointer), which throws.
+template <class T>
+T Check(T result, const std::string& what) {
+  if constexpr (std::is_pointer_v<T>) {
+    if (result == nullptr) throw std::runtime_error(what + " failed");
+  } else if (result < 0) {
     char text[AV_ERROR_MAX_STRING_SIZE] = {};
     av_strerror(result, text, sizeof text);
     throw std::runtime_error(what + ": " + text);
   }
-}
-
-template <class T>
-T* Require(T* pointer, const std::string& what) {
-  if (pointer == nullptr) throw std::runtime_error(what + " failed");
-  return pointer;
+  return result;
 }
 
 template <class T, void (*Free)(T**)>
@@ -109,23 +104,18 @@ using CodecContext = std::unique_ptr<AVCodecContext, Freer<AVCodecContext, avcod
 using Frame = std::unique_ptr<AVFrame, Freer<AVFrame, av_frame_free>>;
 using Packet = std::unique_ptr<AVPacket, Freer<AVPacket, av_packet_free>>;
 
-// The same numbers on every run and every machine, unlike rand().
-struct Noise {
-  std::uint32_t state = 12345;
-  std::uint8_t Next() {
-    return static_cast<std::uint8_t>((state = state * 1664525u + 1013904223u) >> 24);
-  }
-};
-
-void FillPicture(AVFrame& frame, Picture picture, int index, Noise& noise) {
+// Picture `index` of a stream; `state` carries its noise from picture to picture, the same numbers
+// on every run and every machine, unlike rand().
+void FillPicture(AVFrame& frame, Picture picture, int index, std::uint32_t& state) {
+  const auto noise = [&state] { return (state = state * 1664525u + 1013904223u) >> 24; };
   for (int plane = 0; plane < 3; ++plane) {
     for (int y = 0; y < (plane == 0 ? frame.height : frame.height / 2); ++y) {
       std::uint8_t* row = frame.data[plane] + std::ptrdiff_t{y} * frame.linesize[plane];
       for (int x = 0; x < (plane == 0 ? frame.width : frame.width / 2); ++x) {
-        int value = 128;
+        unsigned int value = 128;
         if (picture == Picture::Grainy && plane == 0)
-          value = ((x + y + 3 * index) & 0x7f) + (noise.Next() >> 4) + 56;
-        if (picture == Picture::Noise) value = noise.Next();
+          value = ((x + y + 3 * index) & 0x7f) + (noise() >> 4) + 56;
+        if (picture == Picture::Noise) value = noise();
         row[x] = static_cast<std::uint8_t>(value);
       }
     }
@@ -157,7 +147,7 @@ struct Track {
   std::vector<Packet> packets;
 
   void Keep(const AVPacket& packet) {
-    packets.emplace_back(Require(av_packet_clone(&packet), "copying a packet"));
+    packets.emplace_back(Check(av_packet_clone(&packet), "copying a packet"));
     packets.back()->stream_index = stream->index;
   }
   // Sends `frame` (null to drain) and keeps every packet the encoder gives.
@@ -174,7 +164,7 @@ struct Track {
 };
 
 void SetExtradata(AVCodecParameters& parameters, const char* bytes, std::size_t size) {
-  parameters.extradata = Require(
+  parameters.extradata = Check(
       static_cast<std::uint8_t*>(av_mallocz(size + AV_INPUT_BUFFER_PADDING_SIZE)), "extradata");
   std::memcpy(parameters.extradata, bytes, size);
   parameters.extradata_size = static_cast<int>(size);
@@ -184,7 +174,7 @@ void SetExtradata(AVCodecParameters& parameters, const char* bytes, std::size_t 
 // or the font.
 Track AddRaw(AVFormatContext& output, const Stream& s) {
   Track track;
-  track.stream = Require(avformat_new_stream(&output, nullptr), "adding a stream");
+  track.stream = Check(avformat_new_stream(&output, nullptr), "adding a stream");
   track.stream->time_base = track.timeBase;
   AVCodecParameters& parameters = *track.stream->codecpar;
   parameters.codec_type = s.type;
@@ -198,16 +188,13 @@ Track AddRaw(AVFormatContext& output, const Stream& s) {
   SetExtradata(parameters, kAssHeader, sizeof kAssHeader - 1);
   av_dict_set(&track.stream->metadata, "language", s.language.c_str(), 0);
   av_dict_set(&track.stream->metadata, "title", "Director's commentary", 0);
-  Packet packet(Require(av_packet_alloc(), "allocating a packet"));
-  std::int64_t start = 0;
-  for (const std::string text : {"0,0,Default,,0,0,0,,Hello", "1,0,Default,,0,0,0,,Goodbye"}) {
-    Check(av_new_packet(packet.get(), static_cast<int>(text.size())), "a subtitle packet");
-    std::memcpy(packet->data, text.data(), text.size());
-    packet->pts = packet->dts = start;
-    packet->duration = 400;
+  const std::string kLines[] = {"0,0,Default,,0,0,0,,Hello", "1,0,Default,,0,0,0,,Goodbye"};
+  for (int i = 0; i < 2; ++i) {
+    Packet packet(Check(av_packet_alloc(), "allocating a packet"));
+    Check(av_new_packet(packet.get(), static_cast<int>(kLines[i].size())), "a subtitle packet");
+    std::memcpy(packet->data, kLines[i].data(), kLines[i].size());
+    packet->pts = packet->dts = 500 * i, packet->duration = 400;
     track.Keep(*packet);
-    av_packet_unref(packet.get());
-    start += 500;
   }
   return track;
 }
@@ -216,9 +203,9 @@ Track AddRaw(AVFormatContext& output, const Stream& s) {
 Track Add(AVFormatContext& output, const Stream& s) {
   if (s.type != kVideo && s.type != kAudio) return AddRaw(output, s);
   const AVCodec* codec =
-      Require(s.encoder ? avcodec_find_encoder_by_name(s.encoder) : avcodec_find_encoder(s.codec),
-              "finding the encoder");
-  CodecContext encoder(Require(avcodec_alloc_context3(codec), "allocating an encoder"));
+      Check(s.encoder ? avcodec_find_encoder_by_name(s.encoder) : avcodec_find_encoder(s.codec),
+            "finding the encoder");
+  CodecContext encoder(Check(avcodec_alloc_context3(codec), "allocating an encoder"));
   encoder->thread_count = 1;
   encoder->flags |= AV_CODEC_FLAG_BITEXACT;
   if ((output.oformat->flags & AVFMT_GLOBALHEADER) != 0) {
@@ -245,7 +232,7 @@ Track Add(AVFormatContext& output, const Stream& s) {
   }
   Check(avcodec_open2(encoder.get(), codec, nullptr), "opening the encoder");
   Track track;
-  track.stream = Require(avformat_new_stream(&output, nullptr), "adding a stream");
+  track.stream = Check(avformat_new_stream(&output, nullptr), "adding a stream");
   track.stream->time_base = track.timeBase = encoder->time_base;
   if (video) {
     track.stream->avg_frame_rate = s.rate;
@@ -253,14 +240,14 @@ Track Add(AVFormatContext& output, const Stream& s) {
   }
   Check(avcodec_parameters_from_context(track.stream->codecpar, encoder.get()), "parameters");
   if (!s.language.empty()) av_dict_set(&track.stream->metadata, "language", s.language.c_str(), 0);
-  Frame frame(Require(av_frame_alloc(), "allocating a frame"));
-  Packet packet(Require(av_packet_alloc(), "allocating a packet"));
+  Frame frame(Check(av_frame_alloc(), "allocating a frame"));
+  Packet packet(Check(av_packet_alloc(), "allocating a packet"));
   if (video) {
     frame->format = AV_PIX_FMT_YUV420P;
     frame->width = s.width;
     frame->height = s.height;
     Check(av_frame_get_buffer(frame.get(), 0), "allocating a picture");
-    Noise noise;
+    std::uint32_t noise = 12345;
     for (int i = 0; i < s.frames; ++i) {
       Check(av_frame_make_writable(frame.get()), "writing a picture");
       FillPicture(*frame, s.picture, i, noise);
@@ -285,17 +272,14 @@ Track Add(AVFormatContext& output, const Stream& s) {
   return track;
 }
 
-struct OutputFree {
-  void operator()(AVFormatContext* context) const {
-    if (context->pb != nullptr) avio_closep(&context->pb);
-    avformat_free_context(context);
-  }
-};
-
 void Write(const std::vector<Stream>& streams, const std::string& path) {
   AVFormatContext* raw = nullptr;
   Check(avformat_alloc_output_context2(&raw, nullptr, nullptr, path.c_str()), path);
-  const std::unique_ptr<AVFormatContext, OutputFree> output(raw);
+  const std::unique_ptr<AVFormatContext, void (*)(AVFormatContext*)> output(
+      raw, [](AVFormatContext* c) {
+        if (c->pb != nullptr) avio_closep(&c->pb);
+        avformat_free_context(c);
+      });
   output->flags |= AVFMT_FLAG_BITEXACT;
   // The DASH muxer's MP4 segments take FLAC only as an experimental feature.
   if (std::strcmp(output->oformat->name, "dash") == 0)
@@ -317,27 +301,23 @@ void Write(const std::vector<Stream>& streams, const std::string& path) {
 // Each stream as its encoder's defaults make it: the codec string tests compare the manifest's
 // codecs attribute with their own.
 void WriteStreaming(const std::string& folder) {
-  const struct {
-    const char* name;
-    AVCodecID codec;
-    const char* encoder;
-  } kStreams[] = {
+  const std::tuple<const char*, AVCodecID, const char*> kStreams[] = {
       {"h264", AV_CODEC_ID_H264, nullptr}, {"hevc", AV_CODEC_ID_HEVC, nullptr},
       {"vp9", AV_CODEC_ID_VP9, nullptr},   {"av1", AV_CODEC_ID_AV1, "libsvtav1"},
       {"aac", AV_CODEC_ID_AAC, nullptr},   {"opus", AV_CODEC_ID_OPUS, "libopus"},
       {"flac", AV_CODEC_ID_FLAC, nullptr}, {"ac3", AV_CODEC_ID_AC3, nullptr},
       {"eac3", AV_CODEC_ID_EAC3, nullptr},
   };
-  for (const auto& k : kStreams) {
-    if (!(k.encoder ? avcodec_find_encoder_by_name(k.encoder) : avcodec_find_encoder(k.codec)))
+  for (const auto& [name, codec, encoder] : kStreams) {
+    if (!(encoder ? avcodec_find_encoder_by_name(encoder) : avcodec_find_encoder(codec)))
       continue;  // the tests skip a codec this libavcodec cannot encode
-    const Stream s = avcodec_get_type(k.codec) == kVideo
-                         ? Stream{kVideo, k.codec, 300000,          0,         "", 320, 240, 5,
-                                  {1, 1}, {25, 1}, Picture::Grainy, k.encoder, 0}
-                         : Stream{kAudio, k.codec, 128000, AV_CH_LAYOUT_STEREO, "", 0, 0, 0,
-                                  {},     {},      {},     k.encoder,           0.2};
-    std::filesystem::create_directories(folder + "/" + k.name);
-    Write({s}, folder + "/" + k.name + "/stream.mpd");
+    const Stream s = avcodec_get_type(codec) == kVideo
+                         ? Stream{kVideo, codec,   300000,          0,       "", 320, 240, 5,
+                                  {1, 1}, {25, 1}, Picture::Grainy, encoder, 0}
+                         : Stream{kAudio, codec,   128000, AV_CH_LAYOUT_STEREO, "", 0, 0, 0, {}, {},
+                                  {},     encoder, 0.2};
+    std::filesystem::create_directories(folder + "/" + name);
+    Write({s}, folder + "/" + name + "/stream.mpd");
   }
 }
 
@@ -363,10 +343,9 @@ int main(int argc, char** argv) {
       const std::string folder = argv[i];
       for (const auto& [name, streams] : Files()) Write(streams, folder + "/" + name);
       // sd.mp4 cut short, as by an interrupted download, and a file that is not media.
-      std::ifstream in(folder + "/sd.mp4", std::ios::binary);
-      const std::string bytes((std::istreambuf_iterator<char>(in)),
-                              std::istreambuf_iterator<char>());
-      std::ofstream(folder + "/truncated.mp4", std::ios::binary) << bytes.substr(0, 600);
+      std::filesystem::copy_file(folder + "/sd.mp4", folder + "/truncated.mp4",
+                                 std::filesystem::copy_options::overwrite_existing);
+      std::filesystem::resize_file(folder + "/truncated.mp4", 600);
       std::ofstream(folder + "/notes.txt") << "Shot list\n1. Opening titles\n2. Interview\n";
     }
   } catch (const std::exception& e) {
