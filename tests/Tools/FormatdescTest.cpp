@@ -170,12 +170,10 @@ TEST(Json, DescriptionsReadBack) {
       if (description.contains("bitrate")) back["bitrate"] = description["bitrate"];
       EXPECT_EQ(back, description) << where;
       if (!description.contains("bitrate")) continue;
-      CodecArgs from;
-      from.fromJson = whole, from.stream = stream["index"].dump();
       VideoArgs video;
       AudioArgs audio;
-      video.codec = audio.codec = from;
-      video.codec.bitrateMode = "cbr";
+      audio.codec.fromJson = whole, audio.codec.stream = stream["index"].dump();
+      video.codec = audio.codec, video.codec.bitrateMode = "cbr";
       const Bitrates range = stream["kind"] == "video" ? VideoBitrates(BuildVideo(video))
                                                        : AudioBitrates(BuildAudio(audio));
       EXPECT_EQ(Json({{"default", range.typical}, {"min", range.minimum}, {"max", range.maximum}}),
@@ -331,13 +329,12 @@ TEST(Output, Transcript) {
       {"video --from-caps 'video/x-h264, stream-format=(string)avc, codec_data=(buffer)0164ff'"},
       {"validate stored/streams.json", "validate stored/streams.json --stream 9"},
       {"validate stored/streams.json --stream x:0", "validate stored/streams.json --stream s:0"},
-      {"diff stored/hd.json", "diff stored/hd.json stored/version2.json", "probe"},
+      {"diff stored/hd.json", "diff stored/hd.json stored/version2.json", "probe", "audio"},
       {"probe sd.mp4 --stream 2", "probe sd.mp4 --stream audio", "probe http://localhost/clip.mp4"},
-      {"video --size 64x64", "audio", "validate stored/edited.json"},
+      {"video --size 64x64", "validate stored/edited.json", "validate stored/truncated.json"},
       {"video --codec-id h264 --bitrate-mode CBR --frame-rate 25"},
       {"video --codec-id h264 --bitrate-mode VBR --frame-rate 25 --size 8x8"},
-      {"audio --codec-id mp3 --sample-rate 48000 --layout 5.1 --sample-fmt s16p"},
-      {"validate stored/truncated.json"}};
+      {"audio --codec-id mp3 --sample-rate 48000 --layout 5.1 --sample-fmt s16p"}};
   // A library: every entry in order, the same lines on one thread, the summary on standard error;
   // in text mode, and sharded with GNU parallel; the report well-formed XHTML that fetches
   // nothing, with one dot a video stream with a bitrate, that rsvg-convert draws.
@@ -389,30 +386,24 @@ TEST(Output, Transcript) {
 // writes the files later ones read; with FORMATDESC_UPDATE_EXPECTED set, the blocks are rewritten
 // with what the tool prints instead.
 TEST(Readme, ExamplesPrintWhatTheyShow) {
-  std::string readme = Slurp(FORMATDESC_README);
-  const std::size_t section = readme.find("\n## The formatdesc tool\n");
-  ASSERT_NE(section, std::string::npos);
+  const std::string readme = Slurp(FORMATDESC_README);
+  std::string shown = readme;
+  const std::size_t section = shown.find("\n## The formatdesc tool\n");
   const std::string open = "```console\n$ ";
   int examples = 0;
-  // The section ends at the next heading of its level; updates move it, so it is found anew.
-  for (std::size_t block = readme.find(open, section); block < readme.find("\n## ", section + 1);
-       block = readme.find(open, block + 1)) {
+  // The section ends at the next heading of its level, which the outputs shown move.
+  for (std::size_t block = shown.find(open, section); block < shown.find("\n## ", section + 1);
+       block = shown.find(open, block + 1), ++examples) {
     // The command runs to the first line that does not end in a backslash.
-    std::size_t commandEnd = readme.find('\n', block + open.size());
-    while (readme[commandEnd - 1] == '\\') commandEnd = readme.find('\n', commandEnd + 1);
-    const std::size_t outputEnd = readme.find("```\n", commandEnd);
-    ASSERT_NE(outputEnd, std::string::npos);
-    const std::string command =
-        readme.substr(block + open.size(), commandEnd - block - open.size());
-    const Ran run = Shell(FORMATDESC_README_WORK, command + " 2>&1");
-    ++examples;
-    if (kUpdate) {
-      readme.replace(commandEnd + 1, outputEnd - commandEnd - 1, run.out);
-    } else {
-      EXPECT_EQ(readme.substr(commandEnd + 1, outputEnd - commandEnd - 1), run.out) << command;
-    }
+    std::size_t commandEnd = shown.find('\n', block + open.size());
+    while (shown[commandEnd - 1] == '\\') commandEnd = shown.find('\n', commandEnd + 1);
+    const std::string command = shown.substr(block + open.size(), commandEnd - block - open.size());
+    const std::size_t outputEnd = shown.find("```\n", commandEnd);
+    shown.replace(commandEnd + 1, outputEnd - commandEnd - 1,
+                  Shell(FORMATDESC_README_WORK, command + " 2>&1").out);
   }
-  if (kUpdate) std::ofstream(FORMATDESC_README) << readme;
+  if (kUpdate) std::ofstream(FORMATDESC_README) << shown;
+  EXPECT_EQ(readme, shown);
   EXPECT_GT(examples, 10);
 }
 
@@ -427,9 +418,8 @@ TEST(Audit, LargeDescriptionInLinearTime) {
 #endif
   const auto video = Tarvek::Conf::FormatCodecVideo::Create();
   Tarvek::Core::Property metadata("metadata");
-  for (std::size_t i = 0; i < kEntries; ++i) {
-    metadata.SetChildT<std::string>("key" + std::to_string(i), "value");
-  }
+  for (std::size_t i = 0; i < kEntries; ++i)
+    metadata.SetChildT<std::string>("k" + std::to_string(i), "v");
   video->SetMetadata(metadata);
   const std::string big = Scratch("big.json", Tarvek::Conf::ToJson(video));
   const auto start = std::chrono::steady_clock::now();

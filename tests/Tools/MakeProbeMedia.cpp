@@ -208,25 +208,17 @@ Track Add(AVFormatContext& output, const Stream& s) {
   CodecContext encoder(Check(avcodec_alloc_context3(codec), "allocating an encoder"));
   encoder->thread_count = 1;
   encoder->flags |= AV_CODEC_FLAG_BITEXACT;
-  if ((output.oformat->flags & AVFMT_GLOBALHEADER) != 0) {
-    encoder->flags |= AV_CODEC_FLAG_GLOBAL_HEADER;
-  }
+  if (output.oformat->flags & AVFMT_GLOBALHEADER) encoder->flags |= AV_CODEC_FLAG_GLOBAL_HEADER;
   encoder->bit_rate = s.bitrate;
   const bool video = s.type == kVideo;
   if (video) {
-    encoder->width = s.width;
-    encoder->height = s.height;
-    encoder->sample_aspect_ratio = s.aspect;
-    encoder->time_base = av_inv_q(s.rate);
-    encoder->framerate = s.rate;
-    encoder->pix_fmt = AV_PIX_FMT_YUV420P;
-    encoder->gop_size = 12;
-    encoder->max_b_frames = 0;
+    encoder->width = s.width, encoder->height = s.height, encoder->pix_fmt = AV_PIX_FMT_YUV420P;
+    encoder->sample_aspect_ratio = s.aspect, encoder->framerate = s.rate;
+    encoder->time_base = av_inv_q(s.rate), encoder->gop_size = 12, encoder->max_b_frames = 0;
     if (std::strcmp(codec->name, "libx265") == 0)
       av_opt_set(encoder->priv_data, "x265-params", "log-level=error", 0);
   } else {
-    encoder->sample_rate = 48000;
-    encoder->time_base = AVRational{1, 48000};
+    encoder->sample_rate = 48000, encoder->time_base = AVRational{1, 48000};
     Check(av_channel_layout_from_mask(&encoder->ch_layout, s.layout), "setting the layout");
     encoder->sample_fmt = codec->sample_fmts[0];
   }
@@ -234,39 +226,28 @@ Track Add(AVFormatContext& output, const Stream& s) {
   Track track;
   track.stream = Check(avformat_new_stream(&output, nullptr), "adding a stream");
   track.stream->time_base = track.timeBase = encoder->time_base;
-  if (video) {
-    track.stream->avg_frame_rate = s.rate;
-    track.stream->sample_aspect_ratio = s.aspect;
-  }
+  if (video) track.stream->avg_frame_rate = s.rate, track.stream->sample_aspect_ratio = s.aspect;
   Check(avcodec_parameters_from_context(track.stream->codecpar, encoder.get()), "parameters");
   if (!s.language.empty()) av_dict_set(&track.stream->metadata, "language", s.language.c_str(), 0);
   Frame frame(Check(av_frame_alloc(), "allocating a frame"));
   Packet packet(Check(av_packet_alloc(), "allocating a packet"));
+  int frames = s.frames;
   if (video) {
-    frame->format = AV_PIX_FMT_YUV420P;
-    frame->width = s.width;
-    frame->height = s.height;
-    Check(av_frame_get_buffer(frame.get(), 0), "allocating a picture");
-    std::uint32_t noise = 12345;
-    for (int i = 0; i < s.frames; ++i) {
-      Check(av_frame_make_writable(frame.get()), "writing a picture");
-      FillPicture(*frame, s.picture, i, noise);
-      frame->pts = i;
-      track.Encode(*encoder, frame.get(), *packet);
-    }
+    frame->format = AV_PIX_FMT_YUV420P, frame->width = s.width, frame->height = s.height;
   } else {
-    frame->format = encoder->sample_fmt;
+    frame->format = encoder->sample_fmt, frame->sample_rate = 48000;
     frame->nb_samples = encoder->frame_size > 0 ? encoder->frame_size : 1024;
-    frame->sample_rate = 48000;
+    frames = static_cast<int>(std::ceil(s.seconds * 48000 / frame->nb_samples));
     Check(av_channel_layout_copy(&frame->ch_layout, &encoder->ch_layout), "copying the layout");
-    Check(av_frame_get_buffer(frame.get(), 0), "allocating samples");
-    for (std::int64_t first = 0; first < std::int64_t(s.seconds * 48000);
-         first += frame->nb_samples) {
-      Check(av_frame_make_writable(frame.get()), "writing samples");
-      FillTone(*frame, first);
-      frame->pts = first;
-      track.Encode(*encoder, frame.get(), *packet);
-    }
+  }
+  Check(av_frame_get_buffer(frame.get(), 0), "allocating a frame's buffers");
+  std::uint32_t noise = 12345;
+  for (int i = 0; i < frames; ++i) {
+    Check(av_frame_make_writable(frame.get()), "writing a frame");
+    frame->pts = video ? i : std::int64_t{i} * frame->nb_samples;
+    if (video) FillPicture(*frame, s.picture, i, noise);
+    if (!video) FillTone(*frame, frame->pts);
+    track.Encode(*encoder, frame.get(), *packet);
   }
   track.Encode(*encoder, nullptr, *packet);
   return track;
