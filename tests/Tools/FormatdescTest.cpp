@@ -62,10 +62,10 @@ struct Ran {
 // Runs the shell `command` in `folder`, with the built formatdesc first on the PATH.
 Ran Shell(const std::string& folder, const std::string& command) {
   const std::string err = Scratch("stderr", ""), tools = fs::path(FORMATDESC_TOOL).parent_path();
-  FILE* pipe =
-      popen(("cd '" + folder + "' && PATH='" + tools + "':$PATH && { " + command + "\n} 2>" + err)
-                .c_str(),
-            "r");
+  FILE* pipe = popen(
+      ("cd '" + folder + "' && PATH='" + tools + "':$PATH && { " + command + "\n} 2>'" + err + "'")
+          .c_str(),
+      "r");
   Ran run{-1, "", ""};
   char buffer[4096];
   for (std::size_t n; (n = std::fread(buffer, 1, sizeof buffer, pipe)) > 0;)
