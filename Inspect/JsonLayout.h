@@ -63,39 +63,25 @@ inline void WriteString(const std::string& text, std::string& out) {
     return;
   }
   constexpr char kHex[] = "0123456789abcdef";
+  // The bytes JSON escapes with a letter, each followed by its letter; other control bytes are
+  // written as \u00XX.
+  constexpr char kLetters[] = "\"\"\\\\\bb\ff\nn\rr\tt";
   out += '"';
   for (const char c : text) {
     const auto byte = static_cast<unsigned char>(c);
-    switch (c) {
-      case '"':
-        out += "\\\"";
-        break;
-      case '\\':
-        out += "\\\\";
-        break;
-      case '\b':
-        out += "\\b";
-        break;
-      case '\f':
-        out += "\\f";
-        break;
-      case '\n':
-        out += "\\n";
-        break;
-      case '\r':
-        out += "\\r";
-        break;
-      case '\t':
-        out += "\\t";
-        break;
-      default:
-        if (byte < 0x20) {
-          out += "\\u00";
-          out += kHex[byte >> 4];
-          out += kHex[byte & 0xf];
-        } else {
-          out += c;
-        }
+    if (byte >= 0x20 && c != '"' && c != '\\') {
+      out += c;
+      continue;
+    }
+    out += '\\';
+    const char* letter = kLetters;
+    while (*letter != '\0' && *letter != c) letter += 2;
+    if (*letter != '\0') {
+      out += letter[1];
+    } else {
+      out += "u00";
+      out += kHex[byte >> 4];
+      out += kHex[byte & 0xf];
     }
   }
   out += '"';
