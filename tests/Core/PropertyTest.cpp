@@ -99,6 +99,9 @@ TEST(PropertyTest, AssignmentsKeepNamesAndSurviveAliasing) {
   Property node = SampleTree();
   node = true;
   EXPECT_EQ(node, Property("root", true));
+  node = SampleTree();
+  node = 7LL;
+  EXPECT_EQ(node, Property("root", 7LL));
   node = "literal";
   EXPECT_EQ(node, Property("root", "literal"));
   node = SampleTree();
